@@ -1,0 +1,27 @@
+include(CMakePackageConfigHelpers)
+
+install(TARGETS OxPlatformCore OxClassesDll OxQelDll
+  EXPORT OxQelTargets
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+  ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
+  RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
+  INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/oxqel)
+
+# Public headers keep the source layout, so installed and in-tree includes read the same.
+foreach(dir platform/core OxClasses OxQelLib)
+  install(DIRECTORY ${PROJECT_SOURCE_DIR}/${dir}/
+    DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/oxqel/${dir}
+    FILES_MATCHING PATTERN "*.h")
+endforeach()
+
+install(EXPORT OxQelTargets NAMESPACE OxQel:: DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/OxQel)
+configure_package_config_file(cmake/OxQelConfig.cmake.in
+  ${PROJECT_BINARY_DIR}/OxQelConfig.cmake
+  INSTALL_DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/OxQel)
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/OxQelConfigVersion.cmake
+  COMPATIBILITY SameMajorVersion)
+install(FILES ${PROJECT_BINARY_DIR}/OxQelConfig.cmake ${PROJECT_BINARY_DIR}/OxQelConfigVersion.cmake
+  DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/OxQel)
+
+configure_file(cmake/oxqel.pc.in ${PROJECT_BINARY_DIR}/oxqel.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/oxqel.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
