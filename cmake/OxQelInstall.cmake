@@ -23,5 +23,7 @@ write_basic_package_version_file(${PROJECT_BINARY_DIR}/OxQelConfigVersion.cmake
 install(FILES ${PROJECT_BINARY_DIR}/OxQelConfig.cmake ${PROJECT_BINARY_DIR}/OxQelConfigVersion.cmake
   DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/OxQel)
 
+# The .pc file finds its prefix relative to itself (libdir may have one or two levels).
+file(RELATIVE_PATH OXQEL_PC_TO_PREFIX "/prefix/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/prefix")
 configure_file(cmake/oxqel.pc.in ${PROJECT_BINARY_DIR}/oxqel.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/oxqel.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

@@ -13,7 +13,9 @@ OX_EXPORT std::wstring getQueryCharacterBegin(const FieldType& type);
 OX_EXPORT std::wstring getQueryCharacterEnd(const FieldType& type);
 
 // For MySQL: backquoted identifiers, N'' literals, lower case outside literals,
-// backslashes in literals doubled, and the parentheses of a FROM clause removed.
+// backslashes in literals doubled, and the parentheses of a FROM clause (the nesting of
+// joins) removed. Written for join nesting: a sub-select inside a FROM clause loses its
+// opening parenthesis.
 OX_EXPORT std::wstring formatExprForMySQL(const std::wstring& text);
 // For PostgreSQL: "identifiers" and 'literals' (apostrophes inside are not doubled).
 OX_EXPORT std::wstring formatExprForPostGre(const std::wstring& text);

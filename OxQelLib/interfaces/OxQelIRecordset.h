@@ -71,14 +71,6 @@ public:
     virtual bool setFilter(const OxVariant& filter) = 0;
     virtual bool setSort(const std::wstring& sort) = 0;
 
-    // Literal names pick the name forms, never the variant ones.
-    bool getFieldDef(const wchar_t* name, OxQelFieldDef& d) {
-        return getFieldDef(std::wstring(name), d);
-    }
-    OxQel::FieldType getFieldType(const wchar_t* name) { return getFieldType(std::wstring(name)); }
-    int getFieldSize(const wchar_t* name) { return getFieldSize(std::wstring(name)); }
-    bool isFieldNull(const wchar_t* name) { return isFieldNull(std::wstring(name)); }
-
 protected:
     OxQelIRecordset() = default;
 };

@@ -6,10 +6,6 @@
 class OX_EXPORT OxQelRecordsetDefault : public OxQelIEditRecordset {
     OX_DECLARE_DYNAMIC(OxQelRecordsetDefault)
 public:
-    using OxQelIRecordset::getFieldDef;
-    using OxQelIRecordset::getFieldSize;
-    using OxQelIRecordset::getFieldType;
-    using OxQelIRecordset::isFieldNull;
 
     OxObject* clone() const override;
 

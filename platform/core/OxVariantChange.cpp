@@ -113,12 +113,23 @@ Number parseNumber(std::wstring_view text) {
         fail(OxHr::DISP_E_TYPEMISMATCH);
 
     Number n;
-    if (!point && !exponent && ascii.size() <= 18) {
-        std::from_chars(ascii.data(), ascii.data() + ascii.size(), n.i);
-        n.kind = Number::Int;
-        if (negative)
-            n.i = -n.i;
-        return n;
+    if (!point && !exponent) {
+        // Whole numbers stay exact as far as 64 bits reach.
+        uint64_t u = 0;
+        const auto r = std::from_chars(ascii.data(), ascii.data() + ascii.size(), u);
+        if (r.ec == std::errc() && r.ptr == ascii.data() + ascii.size()) {
+            if (!negative) {
+                n.kind = u > static_cast<uint64_t>(INT64_MAX) ? Number::UInt : Number::Int;
+                n.u = u;
+                n.i = static_cast<int64_t>(u);
+                return n;
+            }
+            if (u <= static_cast<uint64_t>(INT64_MAX) + 1) {
+                n.kind = Number::Int;
+                n.i = static_cast<int64_t>(0 - u);
+                return n;
+            }
+        }
     }
     double v = 0;
     auto [end, ec] = std::from_chars(ascii.data(), ascii.data() + ascii.size(), v);
