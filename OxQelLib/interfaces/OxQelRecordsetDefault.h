@@ -6,7 +6,6 @@
 class OX_EXPORT OxQelRecordsetDefault : public OxQelIEditRecordset {
     OX_DECLARE_DYNAMIC(OxQelRecordsetDefault)
 public:
-
     OxObject* clone() const override;
 
     bool openSQL(OxQelIConnection*, const std::wstring&) override { return false; }

@@ -54,7 +54,8 @@ TEST(ConnectionStringTest, ComposeSetAndRemove) {
     EXPECT_EQ(static_cast<const std::wstring&>(cs), L"UID=u");
     cs.setAt(L"Pwd", L"p");
     cs.compose();
-    EXPECT_TRUE(cs == L"UID=u; PWD=p" || cs == L"PWD=p; UID=u") << static_cast<const std::wstring&>(cs);
+    EXPECT_TRUE(cs == L"UID=u; PWD=p" || cs == L"PWD=p; UID=u")
+        << static_cast<const std::wstring&>(cs);
     cs.removeAt(L"pwd");
     cs.removeAt(L"missing");
     cs.compose();
@@ -62,8 +63,10 @@ TEST(ConnectionStringTest, ComposeSetAndRemove) {
 }
 
 TEST(ConnectionStringTest, MaskHidesEveryCredential) {
-    EXPECT_EQ(OxConnectionString::_maskPasswords(L"DSN=x;UID=me;PWD=secret"), L"DSN=x;UID=me;PWD=***");
-    EXPECT_EQ(OxConnectionString::_maskPasswords(L"UID=me; Password=a;b"), L"UID=me; Password=***;b");
+    EXPECT_EQ(OxConnectionString::_maskPasswords(L"DSN=x;UID=me;PWD=secret"),
+              L"DSN=x;UID=me;PWD=***");
+    EXPECT_EQ(OxConnectionString::_maskPasswords(L"UID=me; Password=a;b"),
+              L"UID=me; Password=***;b");
     EXPECT_EQ(OxConnectionString::_maskPasswords(L"pwd={se;cr}}et};Server=s"), L"pwd=***;Server=s");
     EXPECT_EQ(OxConnectionString::_maskPasswords(L"Jet OLEDB:Database Password='x;y'"),
               L"Jet OLEDB:Database Password=***");

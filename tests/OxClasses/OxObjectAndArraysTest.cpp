@@ -25,10 +25,12 @@ TEST(ObjectTest, RuntimeClassesAndCompare) {
 
 TEST(ArrayTest, JoinRuleWithChunks) {
     OxObject2Array values;
-    for (int i = 0; i < 5; ++i) values.add(new OxObject2({L"k" + std::to_wstring(i), L"v" + std::to_wstring(i)}));
+    for (int i = 0; i < 5; ++i)
+        values.add(new OxObject2({L"k" + std::to_wstring(i), L"v" + std::to_wstring(i)}));
     EXPECT_EQ(values.getListValuesInString(1, L",", 2, L";"), L"v0,v1;v2,v3;v4");
     EXPECT_EQ(values.getListValuesInString(0, L",", 0, L";"), L"k0,k1,k2,k3,k4");
-    EXPECT_EQ(values.getListValuesInString(7, L",", 0, L";"), L",,,,");  // a missing property is empty
+    EXPECT_EQ(values.getListValuesInString(7, L",", 0, L";"),
+              L",,,,");  // a missing property is empty
     OxObject2Array empty;
     EXPECT_EQ(empty.getListValuesInString(0, L",", 2, L";"), L"");
 

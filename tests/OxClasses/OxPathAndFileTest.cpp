@@ -27,7 +27,8 @@ TEST(PathTest, CopyReplacesOnlyWithACompleteFile) {
     EXPECT_TRUE(OxPath::isSameFile(dir.wfile("a.txt"), dir.wfile("link.txt")));
     EXPECT_FALSE(OxPath::copyFile(dir.wfile("a.txt"), dir.wfile("link.txt"), 0));
     EXPECT_EQ(OxTest::readFile(dir.file("a.txt")), "second");
-    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(dir.path()), {}), 3);  // no temp left
+    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(dir.path()), {}),
+              3);  // no temp left
     EXPECT_TRUE(OxPath::deleteFile(dir.wfile("b.txt")));
     EXPECT_TRUE(OxPath::deleteFile(dir.wfile("b.txt")));
 }
@@ -41,13 +42,18 @@ TEST(PathTest, ChangeFileExt) {
 
 TEST(FileInfoTest, KindsByHeader) {
     using F = OxFileInfo;
-    EXPECT_EQ(F::_getFileType(OxTest::testdata("sqlite/Chinook_Sqlite.sqlite").wstring()), F::FileSQLite3);
-    EXPECT_EQ(F::_getFileType(OxTest::testdata("access/jet4_queryTestV2003.mdb").wstring()), F::FileAccessJet);
-    EXPECT_EQ(F::_getFileType(OxTest::testdata("access/jet3_indexTestV1997.mdb").wstring()), F::FileAccessJet);
-    EXPECT_EQ(F::_getFileType(OxTest::testdata("access/ace14_testV2010.accdb").wstring()), F::FileAccessAce);
+    EXPECT_EQ(F::_getFileType(OxTest::testdata("sqlite/Chinook_Sqlite.sqlite").wstring()),
+              F::FileSQLite3);
+    EXPECT_EQ(F::_getFileType(OxTest::testdata("access/jet4_queryTestV2003.mdb").wstring()),
+              F::FileAccessJet);
+    EXPECT_EQ(F::_getFileType(OxTest::testdata("access/jet3_indexTestV1997.mdb").wstring()),
+              F::FileAccessJet);
+    EXPECT_EQ(F::_getFileType(OxTest::testdata("access/ace14_testV2010.accdb").wstring()),
+              F::FileAccessAce);
     EXPECT_EQ(F::_getFileType(OxTest::testdata("xls/date.xls").wstring()), F::FileCompound);
     EXPECT_EQ(F::_getFileType(OxTest::testdata("xlsx/date.xlsx").wstring()), F::FileZipPackage);
-    EXPECT_EQ(F::_getFileType(OxTest::testdata("xls/as3xls_BIFF2.xls").wstring()), F::FileBiffStream);
+    EXPECT_EQ(F::_getFileType(OxTest::testdata("xls/as3xls_BIFF2.xls").wstring()),
+              F::FileBiffStream);
     OxTest::TempDir dir;
     OxTest::writeFile(dir.file("empty"), "");
     OxTest::writeFile(dir.file("short"), "SQLite");
@@ -65,7 +71,8 @@ TEST(UtStringTest, UnicodeFileCreatesThenAppends) {
     EXPECT_EQ(OxTest::readFile(dir.file("log.txt")), "\xC3\xA9 one\ntwo\nthree\n");
     EXPECT_TRUE(OxUtString::writeStringArrayToUnicodeFile(path, {L"new"}, false));
     EXPECT_EQ(OxTest::readFile(dir.file("log.txt")), "new\n");
-    EXPECT_FALSE(OxUtString::writeStringArrayToUnicodeFile(dir.wfile("no/such/dir"), {L"x"}, false));
+    EXPECT_FALSE(
+        OxUtString::writeStringArrayToUnicodeFile(dir.wfile("no/such/dir"), {L"x"}, false));
     EXPECT_EQ(OxUtString::LPCSTR_TO_LPCTSTR("\xE4\xB8\xAD"), L"\u4e2d");
     EXPECT_EQ(OxUtString::LPCSTR_TO_LPCTSTR(nullptr), L"");
 }

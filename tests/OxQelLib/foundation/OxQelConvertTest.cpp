@@ -9,7 +9,10 @@ using namespace OxQel;
 namespace {
 class ConvertTest : public ::testing::Test {
 protected:
-    void SetUp() override { m_saved = OxUserLocale::current(); OxUserLocale::setCurrent(OxUserLocale::fromName("en_US")); }
+    void SetUp() override {
+        m_saved = OxUserLocale::current();
+        OxUserLocale::setCurrent(OxUserLocale::fromName("en_US"));
+    }
     void TearDown() override { OxUserLocale::setCurrent(m_saved); }
 
 private:
@@ -115,7 +118,8 @@ TEST_F(ConvertTest, ToULongReportsFailure) {
     EXPECT_FALSE(_variantToULong(OxVariant(17.4), out));
     EXPECT_EQ(out, 17u);
     EXPECT_TRUE(_variantToULong(OxVariant(-1), out));
-    EXPECT_TRUE(_variantToULong(OxVariant(L"4294967296"), out));  // too big is a failure, not a wrap
+    EXPECT_TRUE(
+        _variantToULong(OxVariant(L"4294967296"), out));  // too big is a failure, not a wrap
     EXPECT_EQ(out, 0u);
 }
 
@@ -155,7 +159,8 @@ TEST_F(ConvertTest, AdoTypeMaps) {
     EXPECT_EQ(QelFieldTypeToADODBType(42), 0);
     // Every library type that maps to ADO maps back to itself, but the ones ADO merges.
     for (int t = Integer; t <= WChar; ++t) {
-        if (t == Binary || t == Char) continue;
+        if (t == Binary || t == Char)
+            continue;
         EXPECT_EQ(ADODBTypeToQelFieldType(QelFieldTypeToADODBType(t)), t) << t;
     }
     EXPECT_TRUE(isStringType(Char));
@@ -181,7 +186,8 @@ TEST_F(ConvertTest, SqlTypeTextsAndColumnClauses) {
               L"VARCHAR (10)  CONSTRAINT DF_t_f DEFAULT '' ");
     EXPECT_EQ(SQLServer::formatStrFieldType(L"t", L"f", Integer, 0, L"0", false),
               L"INT NOT NULL CONSTRAINT DF_t_f DEFAULT 0 ");
-    EXPECT_EQ(SQLServer::formatStrFieldType(L"t", L"f", Date, 0, L"GETDATE()", false), L"DATETIME NULL");
+    EXPECT_EQ(SQLServer::formatStrFieldType(L"t", L"f", Date, 0, L"GETDATE()", false),
+              L"DATETIME NULL");
     EXPECT_EQ(SQLServer::formatStrFieldType(L"t", L"f", WMemo, 0, L"", false), L"");
     EXPECT_FALSE(_checkACEDriverInstalled());
 }

@@ -21,7 +21,8 @@ protected:
         setlogLevel(LogLevelError);
         setDebugInfoType(3);
         setDebugLogFilePath(m_dir.wfile("oxqel.log"));
-        m_previousSink = OxMessageSink::setHandler([this](const std::wstring& t) { m_shown.push_back(t); });
+        m_previousSink =
+            OxMessageSink::setHandler([this](const std::wstring& t) { m_shown.push_back(t); });
     }
     void TearDown() override {
         setDebugInfoType(3);
@@ -30,7 +31,9 @@ protected:
         OxMessageSink::setHandler(m_previousSink);
     }
     std::string log() const { return OxTest::readFile(m_dir.file("oxqel.log")); }
-    static void report() { showDebugErrorMsg(L"boom", LogLevelError, L"X::f", L"OxQelLib/X", 12, L"SELECT 1"); }
+    static void report() {
+        showDebugErrorMsg(L"boom", LogLevelError, L"X::f", L"OxQelLib/X", 12, L"SELECT 1");
+    }
 
     OxTest::TempDir m_dir;
     std::vector<std::wstring> m_shown;
@@ -39,9 +42,11 @@ protected:
 
 TEST_F(LogTest, LineFormat) {
     const std::wstring line = formatLogMessage(L"msg", L"par", L"Fn::op", L"OxQelLib/Fn", 42);
-    const std::regex pattern(R"(^\[\d\d/\d\d/\d{4} \d\d:\d\d:\d\d\] MESSAGE: msg PARAM: par FUNCTION: Fn::op FILE: OxQelLib/Fn LINE: 42\n$)");
+    const std::regex pattern(
+        R"(^\[\d\d/\d\d/\d{4} \d\d:\d\d:\d\d\] MESSAGE: msg PARAM: par FUNCTION: Fn::op FILE: OxQelLib/Fn LINE: 42\n$)");
     EXPECT_TRUE(std::regex_match(OxText::toUtf8(line), pattern)) << OxText::toUtf8(line);
-    EXPECT_EQ(OxDateTime(2026, 12, 4, 9, 5, 0).format(L"[%d/%m/%Y %H:%M:%S]"), L"[04/12/2026 09:05:00]");
+    EXPECT_EQ(OxDateTime(2026, 12, 4, 9, 5, 0).format(L"[%d/%m/%Y %H:%M:%S]"),
+              L"[04/12/2026 09:05:00]");
     // The stamp is today's local date, day first.
     EXPECT_EQ(line.substr(1, 10), OxDateTime::now().format(L"%d/%m/%Y"));
 }
@@ -60,7 +65,8 @@ TEST_F(LogTest, FileFlagCreatesThenAppends) {
     report();
     const std::string text = log();
     EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 2);
-    EXPECT_NE(text.find("MESSAGE: boom PARAM: SELECT 1 FUNCTION: X::f FILE: OxQelLib/X LINE: 12"), std::string::npos);
+    EXPECT_NE(text.find("MESSAGE: boom PARAM: SELECT 1 FUNCTION: X::f FILE: OxQelLib/X LINE: 12"),
+              std::string::npos);
     EXPECT_TRUE(m_shown.empty());
 }
 
@@ -88,7 +94,9 @@ TEST_F(LogTest, DirectWritesIgnoreLevelAndFlags) {
     setDebugInfoType(0);
     writeStringInLogFile(L"Fn::op", L"param", L"message");
     const std::string text = log();
-    EXPECT_NE(text.find("MESSAGE: message PARAM: param FUNCTION: Fn::op FILE:  LINE: -1\n"), std::string::npos) << text;
+    EXPECT_NE(text.find("MESSAGE: message PARAM: param FUNCTION: Fn::op FILE:  LINE: -1\n"),
+              std::string::npos)
+        << text;
     writeStringInLogFile(L"m", L"f", L"file", 3, L"p");
     EXPECT_NE(log().find("MESSAGE: m PARAM: p FUNCTION: f FILE: file LINE: 3"), std::string::npos);
     setDebugLogFilePath(L"");
@@ -117,7 +125,8 @@ TEST_F(LogTest, ExceptionTexts) {
         }
         return std::wstring();
     };
-    EXPECT_EQ(textOf([] { throw OxComError(OxHr::E_FAIL, L"provider said no"); }), L"provider said no");
+    EXPECT_EQ(textOf([] { throw OxComError(OxHr::E_FAIL, L"provider said no"); }),
+              L"provider said no");
     EXPECT_EQ(textOf([] { throw std::runtime_error("\xC3\xA9rror"); }), L"\u00e9rror");
     EXPECT_EQ(textOf([] { throw 42; }), L"Unknown error");
 }

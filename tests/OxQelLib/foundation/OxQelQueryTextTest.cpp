@@ -51,8 +51,10 @@ TEST(RewriterTest, PostgreSql) {
 }
 
 TEST(RewriterTest, MySqlExample) {
-    EXPECT_EQ(formatExprForMySQL(L"SELECT [A] FROM ([T] AS X INNER JOIN [U] ON X.[ID] = [U].[ID]) WHERE [A] = ]]Ab\\c[["),
-              L"select `a` from `t`    x inner join `u` on x.`id` = `u`.`id` where `a` = n'Ab\\\\c'");
+    EXPECT_EQ(
+        formatExprForMySQL(L"SELECT [A] FROM ([T] AS X INNER JOIN [U] ON X.[ID] = [U].[ID]) WHERE "
+                           L"[A] = ]]Ab\\c[["),
+        L"select `a` from `t`    x inner join `u` on x.`id` = `u`.`id` where `a` = n'Ab\\\\c'");
 }
 
 TEST(RewriterTest, MySqlClauses) {

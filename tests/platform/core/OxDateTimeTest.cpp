@@ -6,7 +6,10 @@
 namespace {
 class DateTimeTest : public ::testing::Test {
 protected:
-    void SetUp() override { m_saved = OxUserLocale::current(); OxUserLocale::setCurrent(OxUserLocale::fromName("en_US")); }
+    void SetUp() override {
+        m_saved = OxUserLocale::current();
+        OxUserLocale::setCurrent(OxUserLocale::fromName("en_US"));
+    }
     void TearDown() override { OxUserLocale::setCurrent(m_saved); }
 
 private:

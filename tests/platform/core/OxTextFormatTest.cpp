@@ -17,11 +17,13 @@ TEST(TextTest, Utf8RoundTripsEveryPlane) {
 }
 
 TEST(TextTest, BrokenInputBecomesReplacementCharacters) {
-    EXPECT_EQ(OxText::fromUtf8("a\xFF" "b"), L"a\uFFFDb");
-    EXPECT_EQ(OxText::fromUtf8("\xE4\xB8"), L"\uFFFD");         // cut short
-    EXPECT_EQ(OxText::fromUtf8("\xC0\x80"), L"\uFFFD");         // overlong
-    EXPECT_EQ(OxText::fromUtf8("\xED\xA0\x80"), L"\uFFFD");     // a surrogate
-    EXPECT_EQ(OxText::fromUtf16(u"\xD800x"), L"\uFFFDx");       // lone surrogate
+    EXPECT_EQ(OxText::fromUtf8("a\xFF"
+                               "b"),
+              L"a\uFFFDb");
+    EXPECT_EQ(OxText::fromUtf8("\xE4\xB8"), L"\uFFFD");      // cut short
+    EXPECT_EQ(OxText::fromUtf8("\xC0\x80"), L"\uFFFD");      // overlong
+    EXPECT_EQ(OxText::fromUtf8("\xED\xA0\x80"), L"\uFFFD");  // a surrogate
+    EXPECT_EQ(OxText::fromUtf16(u"\xD800x"), L"\uFFFDx");    // lone surrogate
     EXPECT_EQ(OxText::toUtf8(std::wstring(1, static_cast<wchar_t>(0x110000))), "\xEF\xBF\xBD");
 }
 
@@ -45,8 +47,10 @@ TEST(TextTest, ReplaceAllAndTrim) {
 }
 
 TEST(FormatTest, WideTemplatesTakeAnyText) {
-    EXPECT_EQ(oxFormat(L"DROP TABLE %s; -- %s", std::wstring(L"t\u00e9"), "utf8 \xC3\xA9"), L"DROP TABLE t\u00e9; -- utf8 \u00e9");
-    EXPECT_EQ(oxFormat(L"%d|%5d|%-3d|%02d|%ld|%u", 7, 42, 1, 5, 1L << 40, 3u), L"7|   42|1  |05|1099511627776|3");
+    EXPECT_EQ(oxFormat(L"DROP TABLE %s; -- %s", std::wstring(L"t\u00e9"), "utf8 \xC3\xA9"),
+              L"DROP TABLE t\u00e9; -- utf8 \u00e9");
+    EXPECT_EQ(oxFormat(L"%d|%5d|%-3d|%02d|%ld|%u", 7, 42, 1, 5, 1L << 40, 3u),
+              L"7|   42|1  |05|1099511627776|3");
     EXPECT_EQ(oxFormat(L"%.2f %g %08X %%", 3.14159, 0.5, 0xBEEFu), L"3.14 0.5 0000BEEF %");
     EXPECT_EQ(oxFormat(L"%c%c", L'x', 'y'), L"xy");
 }

@@ -10,9 +10,14 @@ namespace {
 // Every test runs under a known locale and restores the one it found.
 class VariantTest : public ::testing::Test {
 protected:
-    void SetUp() override { m_saved = OxUserLocale::current(); OxUserLocale::setCurrent(OxUserLocale::fromName("en_US")); }
+    void SetUp() override {
+        m_saved = OxUserLocale::current();
+        OxUserLocale::setCurrent(OxUserLocale::fromName("en_US"));
+    }
     void TearDown() override { OxUserLocale::setCurrent(m_saved); }
-    static void useDecimalComma() { OxUserLocale::setCurrent(OxUserLocale::fromName("de_DE.UTF-8")); }
+    static void useDecimalComma() {
+        OxUserLocale::setCurrent(OxUserLocale::fromName("de_DE.UTF-8"));
+    }
 
     static OxHResult changeFails(const OxVariant& v, uint16_t vt) {
         OxVariant out;
@@ -97,7 +102,8 @@ TEST_F(VariantTest, RangesAreChecked) {
     EXPECT_EQ(changeFails(OxVariant(300), VT_UI1), OxHr::DISP_E_OVERFLOW);
     EXPECT_EQ(changeFails(OxVariant(1e300), VT_R4), OxHr::DISP_E_OVERFLOW);
     EXPECT_EQ(changeFails(OxVariant(1e300), VT_DATE), OxHr::DISP_E_OVERFLOW);
-    EXPECT_EQ(changeFails(OxVariant(std::numeric_limits<double>::quiet_NaN()), VT_I8), OxHr::DISP_E_OVERFLOW);
+    EXPECT_EQ(changeFails(OxVariant(std::numeric_limits<double>::quiet_NaN()), VT_I8),
+              OxHr::DISP_E_OVERFLOW);
     EXPECT_EQ(OxVariant(65535).changedType(VT_UI2).uiVal(), 65535);
     EXPECT_EQ(changeFails(OxVariant(65536), VT_UI2), OxHr::DISP_E_OVERFLOW);
     EXPECT_EQ(changeFails(OxVariant(1), 99), OxHr::DISP_E_BADVARTYPE);
