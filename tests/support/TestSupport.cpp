@@ -27,6 +27,16 @@ TempDir::~TempDir() {
     std::filesystem::remove_all(m_path, ec);
 }
 
+ScopedLocale::ScopedLocale(const char* name) : m_saved(OxUserLocale::current()) {
+    use(name);
+}
+ScopedLocale::~ScopedLocale() {
+    OxUserLocale::setCurrent(m_saved);
+}
+void ScopedLocale::use(const char* name) {
+    OxUserLocale::setCurrent(OxUserLocale::fromName(name));
+}
+
 std::string readFile(const std::filesystem::path& path) {
     std::ifstream in(path, std::ios::binary);
     std::ostringstream s;

@@ -3,6 +3,8 @@
 #include <filesystem>
 #include <string>
 
+#include "platform/core/OxUserLocale.h"
+
 // Helpers every suite shares: the shared test files and private temporary folders.
 namespace OxTest {
 // A file of the shared test data ("sqlite/Chinook_Sqlite.sqlite"); the test fails when
@@ -23,6 +25,19 @@ public:
 
 private:
     std::filesystem::path m_path;
+};
+
+// Sets the user locale by name ("de_DE.UTF-8") and restores the previous one.
+class ScopedLocale {
+public:
+    explicit ScopedLocale(const char* name);
+    ~ScopedLocale();
+    ScopedLocale(const ScopedLocale&) = delete;
+    ScopedLocale& operator=(const ScopedLocale&) = delete;
+    void use(const char* name);
+
+private:
+    OxUserLocale m_saved;
 };
 
 std::string readFile(const std::filesystem::path& path);

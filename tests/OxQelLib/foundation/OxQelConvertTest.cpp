@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include "support/TestSupport.h"
+
 #include "OxQelLib/foundation/OxQelConvert.h"
 #include "OxQelLib/foundation/OxQelUnicodeConvertion.h"
 #include "platform/core/OxUserLocale.h"
@@ -9,14 +11,7 @@ using namespace OxQel;
 namespace {
 class ConvertTest : public ::testing::Test {
 protected:
-    void SetUp() override {
-        m_saved = OxUserLocale::current();
-        OxUserLocale::setCurrent(OxUserLocale::fromName("en_US"));
-    }
-    void TearDown() override { OxUserLocale::setCurrent(m_saved); }
-
-private:
-    OxUserLocale m_saved;
+    OxTest::ScopedLocale m_locale{"en_US"};
 };
 
 OxDecimal decimal(uint64_t mantissa, uint8_t scale, bool negative = false) {
@@ -32,7 +27,7 @@ TEST_F(ConvertTest, ToStringAlwaysWritesAPoint) {
     EXPECT_EQ(_variantToString(OxVariant()), L"");
     EXPECT_EQ(_variantToString(OxVariant(L"a,b")), L"a,b");
     EXPECT_EQ(_variantToString(OxVariant(42)), L"42");
-    OxUserLocale::setCurrent(OxUserLocale::fromName("de_DE.UTF-8"));
+    m_locale.use("de_DE.UTF-8");
     EXPECT_EQ(_variantToString(OxVariant(1.5)), L"1.5");
     EXPECT_EQ(_variantToString(OxVariant(2.25f)), L"2.25");
     std::wstring out = L"old";
@@ -80,7 +75,7 @@ TEST_F(ConvertTest, ToDoubleRules) {
     EXPECT_EQ(d(OxVariant(int64_t{1} << 53)), 9007199254740992.0);
     EXPECT_EQ(d(OxVariant::fromCurrency(12345)), 1.2345);
     EXPECT_EQ(d(OxVariant::fromBytes("ab", 2)), 0.0);
-    OxUserLocale::setCurrent(OxUserLocale::fromName("fr_FR"));
+    m_locale.use("fr_FR");
     EXPECT_EQ(d(OxVariant(L"3,25")), 3.25);
 }
 

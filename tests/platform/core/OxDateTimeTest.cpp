@@ -1,19 +1,14 @@
 #include <gtest/gtest.h>
 
+#include "support/TestSupport.h"
+
 #include "platform/core/OxDateTime.h"
 #include "platform/core/OxUserLocale.h"
 
 namespace {
 class DateTimeTest : public ::testing::Test {
 protected:
-    void SetUp() override {
-        m_saved = OxUserLocale::current();
-        OxUserLocale::setCurrent(OxUserLocale::fromName("en_US"));
-    }
-    void TearDown() override { OxUserLocale::setCurrent(m_saved); }
-
-private:
-    OxUserLocale m_saved;
+    OxTest::ScopedLocale m_locale{"en_US"};
 };
 
 TEST_F(DateTimeTest, SerialsMatchThePlatformEpoch) {
@@ -91,7 +86,7 @@ TEST_F(DateTimeTest, RejectsNonDatesWithTheRightValue) {
 }
 
 TEST_F(DateTimeTest, DayFirstLocales) {
-    OxUserLocale::setCurrent(OxUserLocale::fromName("de_DE.UTF-8"));
+    m_locale.use("de_DE.UTF-8");
     OxDateTime d;
     ASSERT_TRUE(d.parseDateTime(L"04.12.2026"));
     EXPECT_EQ(d.getMonth(), 12);

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include "support/TestSupport.h"
+
 #include <cstring>
 #include <limits>
 
@@ -10,22 +12,13 @@ namespace {
 // Every test runs under a known locale and restores the one it found.
 class VariantTest : public ::testing::Test {
 protected:
-    void SetUp() override {
-        m_saved = OxUserLocale::current();
-        OxUserLocale::setCurrent(OxUserLocale::fromName("en_US"));
-    }
-    void TearDown() override { OxUserLocale::setCurrent(m_saved); }
-    static void useDecimalComma() {
-        OxUserLocale::setCurrent(OxUserLocale::fromName("de_DE.UTF-8"));
-    }
+    void useDecimalComma() { m_locale.use("de_DE.UTF-8"); }
 
     static OxHResult changeFails(const OxVariant& v, uint16_t vt) {
         OxVariant out;
         return v.tryChangeType(vt, out);
     }
-
-private:
-    OxUserLocale m_saved;
+    OxTest::ScopedLocale m_locale{"en_US"};
 };
 
 TEST_F(VariantTest, StorageCopiesAndMovesOwnedValues) {
@@ -136,7 +129,7 @@ TEST_F(VariantTest, DatesConvertBothWays) {
     EXPECT_DOUBLE_EQ(OxVariant(L"12/31/2020 12:00").changedType(VT_DATE).date(), 44196.5);
     EXPECT_DOUBLE_EQ(date.changedType(VT_R8).dblVal(), 44196.5);
     EXPECT_EQ(changeFails(OxVariant(L"not a date"), VT_DATE), OxHr::DISP_E_TYPEMISMATCH);
-    OxUserLocale::setCurrent(OxUserLocale::fromName("en_GB"));
+    m_locale.use("en_GB");
     EXPECT_EQ(date.changedType(VT_BSTR).bstr(), L"31/12/2020 12:00:00");
     EXPECT_DOUBLE_EQ(OxVariant(L"31/12/2020").changedType(VT_DATE).date(), 44196.0);
 }
