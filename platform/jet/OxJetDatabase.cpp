@@ -1,0 +1,206 @@
+#include "platform/jet/OxJetDatabase.h"
+
+#include "platform/core/OxFormat.h"
+#include "platform/core/OxText.h"
+#include "platform/jet/OxJetError.h"
+#include "platform/jet/OxJetTableDefReader.h"
+
+namespace {
+constexpr uint32_t kCatalogPage = 2;
+constexpr uint32_t kSystemFlags = 0x80000002;
+constexpr uint32_t kHiddenFlag = 0x8;
+
+enum RawType : int16_t { kTable = 1, kOdbcLinked = 4, kQuery = 5, kLinked = 6 };
+
+std::wstring textOf(const OxJetValue& v) {
+    return v.kind == OxJetValue::Text ? v.text : std::wstring();
+}
+
+int64_t integerOf(const OxJetValue& v) {
+    switch (v.kind) {
+        case OxJetValue::Byte:
+            return v.byte;
+        case OxJetValue::Integer:
+            return v.integer;
+        case OxJetValue::Long:
+            return v.longValue;
+        case OxJetValue::BigInt:
+            return v.bigInt;
+        default:
+            return 0;
+    }
+}
+}  // namespace
+
+std::shared_ptr<OxJetDatabase> OxJetDatabase::open(const std::wstring& path,
+                                                   const OxJetOpenOptions& options,
+                                                   std::wstring& error) {
+    try {
+        return finishOpen(OxJetPageFile::openFile(OxText::toUtf8(path)), options);
+    } catch (const OxJetError& e) {
+        error = oxFormat(L"%s: %s", path, e.message());
+    } catch (const std::bad_alloc&) {
+        error = oxFormat(L"%s: out of memory while reading the catalog", path);
+    }
+    return nullptr;
+}
+
+std::shared_ptr<OxJetDatabase> OxJetDatabase::openBuffer(std::vector<uint8_t> bytes,
+                                                         const OxJetOpenOptions& options,
+                                                         std::wstring& error) {
+    try {
+        return finishOpen(OxJetPageFile::openBuffer(std::move(bytes)), options);
+    } catch (const OxJetError& e) {
+        error = e.message();
+    } catch (const std::bad_alloc&) {
+        error = L"out of memory while reading the catalog";
+    }
+    return nullptr;
+}
+
+std::shared_ptr<OxJetDatabase> OxJetDatabase::finishOpen(std::shared_ptr<OxJetPageFile> file,
+                                                         const OxJetOpenOptions& options) {
+    std::shared_ptr<OxJetDatabase> db(new OxJetDatabase());
+    db->m_file = std::move(file);
+    db->m_options = options;
+    const OxJetHeader& h = db->m_file->header();
+    db->m_codePage = options.codePage ? options.codePage : (h.codePage ? h.codePage : 1252);
+    if (h.isJet3())
+        OxJetText probe(db->m_codePage);  // an unknown code page fails here, not per row
+    db->readCatalog();
+    return db;
+}
+
+void OxJetDatabase::readCatalog() {
+    std::shared_ptr<OxJetTableDef> def;
+    try {
+        def = std::make_shared<OxJetTableDef>(
+            OxJetTableDefReader::read(*m_file, kCatalogPage, L"MSysObjects", m_codePage));
+    } catch (const OxJetError& e) {
+        throw OxJetError(L"the catalog cannot be read (the file is damaged or encrypted): " +
+                         e.message());
+    }
+    const int id = def->columnIndex(L"Id");
+    const int parent = def->columnIndex(L"ParentId");
+    const int name = def->columnIndex(L"Name");
+    const int type = def->columnIndex(L"Type");
+    const int flags = def->columnIndex(L"Flags");
+    const int database = def->columnIndex(L"Database");
+    const int connect = def->columnIndex(L"Connect");
+    const int foreign = def->columnIndex(L"ForeignName");
+    const int props = def->columnIndex(L"LvProp");
+    if (id < 0 || name < 0 || type < 0)
+        throw OxJetError(L"the catalog lacks its Id, Name or Type column (damaged file)");
+    std::vector<bool> wanted(def->columns.size(), false);
+    for (int col : {id, parent, name, type, flags, database, connect, foreign, props})
+        if (col >= 0)
+            wanted[static_cast<size_t>(col)] = true;
+
+    OxJetRowCursor cursor(m_file, def, m_codePage, OxJetBadRows::Fail);
+    cursor.selectColumns(wanted);
+    auto at = [&](int col) -> const OxJetValue& {
+        static const OxJetValue null;
+        return col < 0 ? null : cursor.value(static_cast<size_t>(col));
+    };
+    while (cursor.next()) {
+        const int16_t raw = static_cast<int16_t>(integerOf(at(type)));
+        OxJetCatalogEntry e;
+        switch (raw) {
+            case kTable:
+                e.kind = OxJetObjectKind::Table;
+                break;
+            case kQuery:
+                e.kind = OxJetObjectKind::Query;
+                break;
+            case kLinked:
+                e.kind = OxJetObjectKind::LinkedTable;
+                break;
+            case kOdbcLinked:
+                e.kind = OxJetObjectKind::LinkedOdbcTable;
+                break;
+            default:
+                continue;  // forms, reports, containers, relationships
+        }
+        e.rawType = raw;
+        e.id = static_cast<int32_t>(integerOf(at(id)));
+        e.parentId = static_cast<int32_t>(integerOf(at(parent)));
+        e.name = textOf(at(name));
+        e.flags = static_cast<uint32_t>(integerOf(at(flags)));
+        e.hidden = (e.flags & kHiddenFlag) != 0;
+        if (e.kind == OxJetObjectKind::Table) {
+            e.definitionPage = static_cast<uint32_t>(e.id) & 0x00FFFFFF;
+            if (e.flags & kSystemFlags)
+                e.kind = OxJetObjectKind::SystemTable;
+        }
+        e.linkedDatabase = textOf(at(database));
+        e.connect = textOf(at(connect));
+        e.foreignName = textOf(at(foreign));
+        if (at(props).kind == OxJetValue::Binary)
+            e.propertyBlob = at(props).bytes;
+        m_catalog.push_back(std::move(e));
+    }
+    if (cursor.failed())
+        throw OxJetError(L"the catalog cannot be read: " + cursor.error());
+}
+
+const OxJetCatalogEntry* OxJetDatabase::find(std::wstring_view name) const {
+    const OxJetCatalogEntry* query = nullptr;
+    for (const OxJetCatalogEntry& e : m_catalog) {
+        if (!OxText::equalsNoCase(e.name, name))
+            continue;
+        if (e.kind != OxJetObjectKind::Query)
+            return &e;
+        if (!query)
+            query = &e;
+    }
+    return query;
+}
+
+std::shared_ptr<const OxJetTableDef> OxJetDatabase::tableDef(const OxJetCatalogEntry& entry,
+                                                             std::wstring& error) const {
+    switch (entry.kind) {
+        case OxJetObjectKind::Query:
+            error = oxFormat(L"%s is a saved query, not a table", entry.name);
+            return nullptr;
+        case OxJetObjectKind::LinkedTable:
+        case OxJetObjectKind::LinkedOdbcTable:
+            error = oxFormat(L"%s is a linked table (%s in %s); open its own file to read it",
+                             entry.name, entry.foreignName,
+                             entry.linkedDatabase.empty() ? entry.connect : entry.linkedDatabase);
+            return nullptr;
+        default:
+            break;
+    }
+    try {
+        auto def = std::make_shared<OxJetTableDef>(
+            OxJetTableDefReader::read(*m_file, entry.definitionPage, entry.name, m_codePage));
+        try {
+            OxJetTableDefReader::applyProperties(*def, entry.propertyBlob, header().isJet3(),
+                                                 m_codePage);
+        } catch (const OxJetError& e) {
+            def->propertyError = e.message();  // the data stays readable without them
+        }
+        return def;
+    } catch (const OxJetError& e) {
+        error = oxFormat(L"table %s: %s", entry.name, e.message());
+    } catch (const std::bad_alloc&) {
+        error = oxFormat(L"table %s: out of memory reading its definition", entry.name);
+    }
+    return nullptr;
+}
+
+std::shared_ptr<const OxJetTableDef> OxJetDatabase::tableDef(std::wstring_view name,
+                                                             std::wstring& error) const {
+    const OxJetCatalogEntry* e = find(name);
+    if (!e) {
+        error = oxFormat(L"no table or query named %s", std::wstring(name));
+        return nullptr;
+    }
+    return tableDef(*e, error);
+}
+
+std::unique_ptr<OxJetRowCursor> OxJetDatabase::openCursor(
+    std::shared_ptr<const OxJetTableDef> table) const {
+    return std::make_unique<OxJetRowCursor>(m_file, std::move(table), m_codePage,
+                                            m_options.badRows);
+}
