@@ -57,7 +57,14 @@ int listTables(const OxJetDatabase& db, bool system) {
         if (e.kind == OxJetObjectKind::Table || e.kind == OxJetObjectKind::SystemTable) {
             std::wstring error;
             if (auto def = db.tableDef(e, error)) {
-                rows = std::to_wstring(def->rowCount);
+                // Counted, not the stored counter, which files not closed cleanly leave stale.
+                auto cursor = db.openCursor(def);
+                cursor->selectColumns(std::vector<bool>(def->columns.size(), false));
+                while (cursor->next()) {
+                }
+                rows = cursor->failed() ? L"?" : std::to_wstring(cursor->rowsRead());
+                if (cursor->failed())
+                    std::fprintf(stderr, "oxqel: %s\n", OxText::toUtf8(cursor->error()).c_str());
                 columns = std::to_wstring(def->columns.size());
             } else {
                 std::fprintf(stderr, "oxqel: %s\n", OxText::toUtf8(error).c_str());
