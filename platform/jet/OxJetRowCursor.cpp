@@ -118,7 +118,7 @@ void OxJetRowCursor::rewind() {
     m_nextPage = 0;
     m_error.clear();
     m_firstSkip.clear();
-    m_rowsRead = m_skippedRows = m_skippedPages = 0;
+    m_rowsRead = m_skippedRows = m_skippedPages = m_strayPages = 0;
 }
 
 bool OxJetRowCursor::fail(const std::wstring& message) {
@@ -127,10 +127,10 @@ bool OxJetRowCursor::fail(const std::wstring& message) {
     return false;
 }
 
-bool OxJetRowCursor::skip(const std::wstring& message, bool page) {
+bool OxJetRowCursor::skip(const std::wstring& message, bool page, uint64_t count) {
     if (m_badRows == OxJetBadRows::Fail)
         return fail(message);
-    (page ? m_skippedPages : m_skippedRows)++;
+    (page ? m_skippedPages : m_skippedRows) += count;
     if (m_firstSkip.empty())
         m_firstSkip = message;
     return true;
@@ -148,10 +148,8 @@ bool OxJetRowCursor::start() {
         if (pages.pastEnd > 0 &&
             !skip(oxFormat(L"%u of its data pages lie past the end of the file (truncated file)",
                            pages.pastEnd),
-                  true))
+                  true, pages.pastEnd))
             return false;
-        if (pages.pastEnd > 0)
-            m_skippedPages += pages.pastEnd - 1;
     } catch (const OxJetError& e) {
         return fail(e.message());
     }
@@ -164,9 +162,12 @@ bool OxJetRowCursor::loadPage() {
         const uint32_t pg = m_pages[m_nextPage++];
         try {
             m_file->read(pg, m_page.data());
-            // Maps may mark pages the table no longer uses; only its own data pages count.
-            if (m_page[0] != kDataPage || OxJetBytes::u32(m_page.data() + 4) != m_table->page)
+            // A map that marks a page without rows of the table is stale or damaged: counted,
+            // since the rows it should hold may be lost.
+            if (m_page[0] != kDataPage || OxJetBytes::u32(m_page.data() + 4) != m_table->page) {
+                ++m_strayPages;
                 continue;
+            }
             m_pageRows = m_file->rowCount(m_page.data());
         } catch (const OxJetError& e) {
             if (!skip(e.message(), true))

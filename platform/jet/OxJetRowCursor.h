@@ -46,6 +46,9 @@ public:
     uint64_t skippedRows() const { return m_skippedRows; }
     uint64_t skippedPages() const { return m_skippedPages; }
     const std::wstring& firstSkipReason() const { return m_firstSkip; }
+    // Pages the table's map marks that hold none of its rows: a stale map, or damage that
+    // may have cost rows. Reported, not an error: the file gives no way to tell.
+    uint64_t strayPages() const { return m_strayPages; }
 
 private:
     struct Column;
@@ -57,7 +60,7 @@ private:
     const uint8_t* longValueRow(uint32_t pointer, uint32_t& size);
     const uint8_t* movedRow(const uint8_t* stub, uint32_t stubSize, uint32_t& size);
     bool fail(const std::wstring& message);
-    bool skip(const std::wstring& message, bool page);
+    bool skip(const std::wstring& message, bool page, uint64_t count = 1);
 
     std::shared_ptr<const OxJetPageFile> m_file;
     std::shared_ptr<const OxJetTableDef> m_table;
@@ -89,4 +92,5 @@ private:
     uint64_t m_rowsRead = 0;
     uint64_t m_skippedRows = 0;
     uint64_t m_skippedPages = 0;
+    uint64_t m_strayPages = 0;
 };

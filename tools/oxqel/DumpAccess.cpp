@@ -251,6 +251,12 @@ int printRows(const OxJetDatabase& db, std::shared_ptr<const OxJetTableDef> def,
     out.flush();
     if (cursor->failed())
         return fail(cursor->error());
+    if (cursor->strayPages())
+        std::fprintf(stderr,
+                     "oxqel: warning: %llu pages marked as %s's hold none of its rows (stale "
+                     "map or damaged file)\n",
+                     static_cast<unsigned long long>(cursor->strayPages()),
+                     OxText::toUtf8(def->name).c_str());
     if (cursor->skippedRows() || cursor->skippedPages()) {
         fail(oxFormat(
             L"%u rows and %u pages of %s could not be read and were skipped (first: "
