@@ -96,7 +96,8 @@ void OxJetDatabase::readCatalog() {
         if (col >= 0)
             wanted[static_cast<size_t>(col)] = true;
 
-    OxJetRowCursor cursor(m_file, def, m_codePage, OxJetBadRows::Fail);
+    // A damaged catalog row hides an object: it fails the open unless the caller skips.
+    OxJetRowCursor cursor(m_file, def, m_codePage, m_options.badRows);
     cursor.selectColumns(wanted);
     auto at = [&](int col) -> const OxJetValue& {
         static const OxJetValue null;
@@ -141,6 +142,8 @@ void OxJetDatabase::readCatalog() {
     }
     if (cursor.failed())
         throw OxJetError(L"the catalog cannot be read: " + cursor.error());
+    m_catalogSkipped = cursor.skippedRows() + cursor.skippedPages();
+    m_catalogSkipReason = cursor.firstSkipReason();
 }
 
 const OxJetCatalogEntry* OxJetDatabase::find(std::wstring_view name) const {

@@ -40,6 +40,10 @@ public:
 
     // Local, system and linked tables and saved queries, in catalog order.
     const std::vector<OxJetCatalogEntry>& catalog() const { return m_catalog; }
+    // Catalog rows and pages skipped as damaged (only when opened with OxJetBadRows::Skip):
+    // objects that may be missing from catalog().
+    uint64_t catalogSkipped() const { return m_catalogSkipped; }
+    const std::wstring& catalogSkipReason() const { return m_catalogSkipReason; }
     // The entry of that name (case-insensitive), tables before queries; nullptr if none.
     const OxJetCatalogEntry* find(std::wstring_view name) const;
 
@@ -62,4 +66,6 @@ private:
     OxJetOpenOptions m_options;
     uint16_t m_codePage = 0;
     std::vector<OxJetCatalogEntry> m_catalog;
+    uint64_t m_catalogSkipped = 0;
+    std::wstring m_catalogSkipReason;
 };

@@ -295,6 +295,10 @@ int runDumpAccess(const OxqelArgs& input) {
     auto db = OxJetDatabase::open(OxText::fromUtf8(path), options, error);
     if (!db)
         return fail(error);
+    if (db->catalogSkipped())
+        std::fprintf(stderr, "oxqel: warning: %llu damaged catalog entries skipped (first: %s)\n",
+                     static_cast<unsigned long long>(db->catalogSkipped()),
+                     OxText::toUtf8(db->catalogSkipReason()).c_str());
     if (args.empty()) {
         if (schema || json || csv)
             return oxqelFail("dump: name a table to print");
