@@ -79,8 +79,12 @@ std::string theirForm(const OxJetValue& v) {
             if (v.real < kFirstGoodDate || v.real > kLastGoodDate)
                 return "";
             return OxText::toUtf8(v.toText());
-        case OxJetValue::Guid:
-            return hexOf(OxText::toUtf8(v.toText()));
+        case OxJetValue::Guid: {
+            // It leaves out the hyphen before the last group.
+            std::string text = OxText::toUtf8(v.toText());
+            text.erase(text.rfind('-'), 1);
+            return hexOf(text);
+        }
         default:
             return OxText::toUtf8(v.toText());
     }
