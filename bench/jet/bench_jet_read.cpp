@@ -53,6 +53,19 @@ double childCpu(const std::vector<std::string>& argv, const std::string& outFile
     return seconds(use.ru_utime) + seconds(use.ru_stime);
 }
 
+// The benchmark files: $OXQEL_TESTDATA, else the shared folder beside the sources.
+std::filesystem::path benchData() {
+    std::vector<std::filesystem::path> candidates;
+    if (const char* env = std::getenv("OXQEL_TESTDATA"))
+        candidates.emplace_back(env);
+    candidates.emplace_back(std::filesystem::path(OXQEL_SOURCE_DIR) / ".." / "shared" / "testdata");
+    candidates.emplace_back("/work/shared/testdata");
+    for (const auto& c : candidates)
+        if (std::filesystem::exists(c / "access" / "bench"))
+            return c / "access" / "bench";
+    return candidates.back() / "access" / "bench";
+}
+
 double median(std::vector<double> v) {
     std::sort(v.begin(), v.end());
     return v[v.size() / 2];
@@ -118,7 +131,7 @@ double readInProcess(const std::string& path, const std::wstring& table, bool as
 }  // namespace
 
 int main() {
-    const std::filesystem::path data = OXQEL_BENCH_DATA;
+    const std::filesystem::path data = benchData();
     const std::filesystem::path dir =
         std::filesystem::temp_directory_path() / ("oxqel-bench-jet-" + std::to_string(getpid()));
     std::filesystem::create_directories(dir);

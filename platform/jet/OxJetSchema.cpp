@@ -44,8 +44,6 @@ const wchar_t* oxJetTypeName(uint8_t type) {
             return L"Replication ID";
         case OxJetType::Numeric:
             return L"Decimal";
-        case OxJetType::Attachment:
-            return L"Attachment";
         case OxJetType::Complex:
             return L"Complex";
         case OxJetType::BigInt:

@@ -28,8 +28,7 @@ enum class OxJetType : uint8_t {
     Memo = 0x0C,
     ReplicationId = 0x0F,
     Numeric = 0x10,
-    Attachment = 0x11,
-    Complex = 0x12,
+    Complex = 0x12,  // attachments, multi-value fields, memo version history
     BigInt = 0x13,
     DateTimeExtended = 0x14,
 };

@@ -100,10 +100,9 @@ void classify(OxJetColumn& c, uint8_t extFlags, bool jet3) {
         case OxJetType::Numeric:
         case OxJetType::BigInt:
             break;
-        case OxJetType::Attachment:
         case OxJetType::Complex:
             c.supported = false;
-            c.unsupportedReason = L"attachment or multi-value field";
+            c.unsupportedReason = L"attachment, multi-value or version history field";
             break;
         case OxJetType::DateTimeExtended:
             c.supported = false;
