@@ -1,5 +1,7 @@
 #include "platform/jet/OxJetDatabase.h"
 
+#include <algorithm>
+
 #include "platform/core/OxFormat.h"
 #include "platform/core/OxText.h"
 #include "platform/jet/OxJetError.h"
@@ -9,6 +11,11 @@ namespace {
 constexpr uint32_t kCatalogPage = 2;
 constexpr uint32_t kSystemFlags = 0x80000002;
 constexpr uint32_t kHiddenFlag = 0x8;
+constexpr uint32_t kOneToOne = 0x1;
+constexpr uint32_t kNotEnforced = 0x2;
+constexpr uint32_t kCascadeUpdates = 0x100;
+constexpr uint32_t kCascadeDeletes = 0x1000;
+constexpr uint32_t kCascadeNulls = 0x2000;
 
 enum RawType : int16_t { kTable = 1, kOdbcLinked = 4, kQuery = 5, kLinked = 6 };
 
@@ -200,6 +207,71 @@ std::shared_ptr<const OxJetTableDef> OxJetDatabase::tableDef(std::wstring_view n
         return nullptr;
     }
     return tableDef(*e, error);
+}
+
+bool OxJetDatabase::relationships(std::vector<OxJetRelationship>& out, std::wstring& error) const {
+    out.clear();
+    const OxJetCatalogEntry* entry = find(L"MSysRelationships");
+    if (!entry || entry->kind != OxJetObjectKind::SystemTable)
+        return true;
+    auto def = tableDef(*entry, error);
+    if (!def)
+        return false;
+    const int name = def->columnIndex(L"szRelationship");
+    const int flags = def->columnIndex(L"grbit");
+    const int position = def->columnIndex(L"icolumn");
+    const int table = def->columnIndex(L"szObject");
+    const int column = def->columnIndex(L"szColumn");
+    const int referenced = def->columnIndex(L"szReferencedObject");
+    const int referencedColumn = def->columnIndex(L"szReferencedColumn");
+    if (name < 0 || table < 0 || column < 0 || referenced < 0 || referencedColumn < 0) {
+        error = L"MSysRelationships lacks the columns of a relationship (damaged file)";
+        return false;
+    }
+    // One row per column pair; a relationship's rows share its name.
+    struct Part {
+        int64_t position;
+        std::wstring column, referenced;
+    };
+    std::vector<std::vector<Part>> parts;
+    auto cursor = openCursor(def);
+    auto text = [&](int col) { return textOf(cursor->value(static_cast<size_t>(col))); };
+    while (cursor->next()) {
+        const std::wstring relName = text(name);
+        auto it = std::find_if(out.begin(), out.end(),
+                               [&](const OxJetRelationship& r) { return r.name == relName; });
+        if (it == out.end()) {
+            OxJetRelationship r;
+            r.name = relName;
+            r.table = text(table);
+            r.referencedTable = text(referenced);
+            if (flags >= 0)
+                r.flags = static_cast<uint32_t>(integerOf(cursor->value(size_t(flags))));
+            r.enforced = !(r.flags & kNotEnforced);
+            r.oneToOne = (r.flags & kOneToOne) != 0;
+            r.cascadeUpdates = (r.flags & kCascadeUpdates) != 0;
+            r.cascadeDeletes = (r.flags & kCascadeDeletes) != 0;
+            r.cascadeNulls = (r.flags & kCascadeNulls) != 0;
+            out.push_back(std::move(r));
+            parts.emplace_back();
+            it = out.end() - 1;
+        }
+        parts[size_t(it - out.begin())].push_back(
+            {position >= 0 ? integerOf(cursor->value(size_t(position))) : 0, text(column),
+             text(referencedColumn)});
+    }
+    if (cursor->failed()) {
+        error = cursor->error();
+        out.clear();
+        return false;
+    }
+    for (size_t i = 0; i < out.size(); ++i) {
+        std::stable_sort(parts[i].begin(), parts[i].end(),
+                         [](const Part& a, const Part& b) { return a.position < b.position; });
+        for (auto& p : parts[i])
+            out[i].columns.emplace_back(std::move(p.column), std::move(p.referenced));
+    }
+    return true;
 }
 
 std::unique_ptr<OxJetRowCursor> OxJetDatabase::openCursor(

@@ -54,6 +54,10 @@ public:
     std::shared_ptr<const OxJetTableDef> tableDef(std::wstring_view name,
                                                   std::wstring& error) const;
 
+    // The relationships MSysRelationships lists (none when the file has no such table), in
+    // its order; false with error set when the table cannot be read.
+    bool relationships(std::vector<OxJetRelationship>& out, std::wstring& error) const;
+
     // A cursor over the table's rows (errors surface from its next()).
     std::unique_ptr<OxJetRowCursor> openCursor(std::shared_ptr<const OxJetTableDef> table) const;
 

@@ -97,6 +97,20 @@ struct OxJetTableDef {
     int columnIndex(std::wstring_view name) const;
 };
 
+// A relationship between two tables, as MSysRelationships keeps it.
+struct OxJetRelationship {
+    std::wstring name;
+    std::wstring table;            // the table whose columns refer to the other
+    std::wstring referencedTable;  // the table referred to
+    std::vector<std::pair<std::wstring, std::wstring>> columns;  // (column, referenced column)
+    uint32_t flags = 0;
+    bool enforced = true;  // referential integrity
+    bool oneToOne = false;
+    bool cascadeUpdates = false;
+    bool cascadeDeletes = false;
+    bool cascadeNulls = false;  // deleting a referenced row sets the columns to NULL
+};
+
 enum class OxJetObjectKind : uint8_t {
     Table,
     SystemTable,

@@ -81,7 +81,15 @@ int listTables(const OxJetDatabase& db, bool system) {
     return 0;
 }
 
-int printSchema(const OxJetTableDef& def) {
+std::wstring columnList(const std::vector<std::pair<std::wstring, std::wstring>>& pairs,
+                        bool referenced) {
+    std::wstring out;
+    for (const auto& p : pairs)
+        out += (out.empty() ? L"" : L", ") + (referenced ? p.second : p.first);
+    return out;
+}
+
+int printSchema(const OxJetDatabase& db, const OxJetTableDef& def) {
     Out out;
     out.line(oxFormat(L"table %s (%u rows)", def.name, def.rowCount));
     out.line(L"columns:");
@@ -114,6 +122,30 @@ int printSchema(const OxJetTableDef& def) {
             line += L" UNIQUE";
         if (ix.foreignKey)
             line += L" FOREIGN KEY";
+        out.line(line);
+    }
+    std::vector<OxJetRelationship> relationships;
+    std::wstring error;
+    if (!db.relationships(relationships, error))
+        std::fprintf(stderr, "oxqel: relationships not read: %s\n", OxText::toUtf8(error).c_str());
+    bool header = false;
+    for (const auto& r : relationships) {
+        if (!OxText::equalsNoCase(r.table, def.name))
+            continue;
+        if (!header)
+            out.line(L"foreign keys:");
+        header = true;
+        std::wstring line =
+            oxFormat(L"  %s (%s) REFERENCES %s (%s)", r.name, columnList(r.columns, false),
+                     r.referencedTable, columnList(r.columns, true));
+        if (r.cascadeUpdates)
+            line += L" ON UPDATE CASCADE";
+        if (r.cascadeDeletes)
+            line += L" ON DELETE CASCADE";
+        if (r.cascadeNulls)
+            line += L" ON DELETE SET NULL";
+        if (!r.enforced)
+            line += L" NOT ENFORCED";
         out.line(line);
     }
     if (!def.propertyError.empty())
@@ -308,7 +340,7 @@ int runDumpAccess(const OxqelArgs& input) {
     if (!def)
         return fail(error);
     if (schema)
-        return printSchema(*def);
+        return printSchema(*db, *def);
     return printRows(*db, def, json);
 }
 

@@ -303,6 +303,23 @@ TEST(OxJetSchemaRead, ColumnsAndIndexes) {
         foreign = foreign || (ix.foreignKey && ix.columns.size() == 1);
     EXPECT_TRUE(foreign) << "the relationship's index keeps its column";
 
+    std::vector<OxJetRelationship> relationships;
+    ASSERT_TRUE(big->relationships(relationships, error));
+    ASSERT_EQ(relationships.size(), 2u);
+    const OxJetRelationship& del = relationships[0];
+    EXPECT_EQ(del.name, L"Table2Table1");
+    EXPECT_EQ(del.table, L"Table1");
+    EXPECT_EQ(del.referencedTable, L"Table2");
+    EXPECT_EQ(del.columns,
+              (std::vector<std::pair<std::wstring, std::wstring>>{{L"otherfk1", L"id"}}));
+    EXPECT_TRUE(del.enforced);
+    EXPECT_TRUE(del.cascadeDeletes);
+    EXPECT_FALSE(del.cascadeUpdates);
+    EXPECT_TRUE(relationships[1].cascadeUpdates);
+    EXPECT_FALSE(relationships[1].cascadeDeletes);
+    ASSERT_TRUE(db->relationships(relationships, error));  // testV2010 has none
+    EXPECT_TRUE(relationships.empty());
+
     auto counter = JetTest::open(JetTest::accessFile("ace12_unsupportedFieldsTestV2007.accdb"));
     ASSERT_TRUE(counter);
     auto test = counter->tableDef(L"Test", error);
