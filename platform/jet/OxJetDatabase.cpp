@@ -276,6 +276,8 @@ bool OxJetDatabase::relationships(std::vector<OxJetRelationship>& out, std::wstr
 
 std::unique_ptr<OxJetRowCursor> OxJetDatabase::openCursor(
     std::shared_ptr<const OxJetTableDef> table) const {
+    if (!table)
+        return nullptr;
     return std::make_unique<OxJetRowCursor>(m_file, std::move(table), m_codePage,
                                             m_options.badRows);
 }

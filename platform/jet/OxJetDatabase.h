@@ -58,7 +58,7 @@ public:
     // its order; false with error set when the table cannot be read.
     bool relationships(std::vector<OxJetRelationship>& out, std::wstring& error) const;
 
-    // A cursor over the table's rows (errors surface from its next()).
+    // A cursor over the table's rows (errors surface from its next()); nullptr for no table.
     std::unique_ptr<OxJetRowCursor> openCursor(std::shared_ptr<const OxJetTableDef> table) const;
 
 private:
