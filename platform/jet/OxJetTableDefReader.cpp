@@ -10,20 +10,70 @@
 #include "platform/jet/OxJetText.h"
 
 namespace {
-// Where the fields sit in the two layouts of a definition.
+// Where the fields sit in the two layouts of a definition (offsets in bytes).
 struct Layout {
-    size_t rowCount, autoNumber, maxCols, varCols, numCols, numIndexes, numRealIndexes, ownedPages,
-        headerEnd, realIndexCount;
-    size_t columnEntry, colType, colNumber, colVarIndex, colPrecision, colScale, colFlags,
-        colExtFlags, colFixedOffset, colLength;
-    size_t realIndexSkip, realIndexAfterCols, realIndexBeforeFlags, realIndexAfterFlags;
+    // The header.
+    size_t rowCount, autoNumber, varCols, numCols, numIndexes, numRealIndexes, ownedPages,
+        headerEnd;
+    size_t realIndexCount;  // per-index entry between the header and the columns
+    // One column entry.
+    size_t columnEntry, colNumber, colVarIndex, colPrecision, colScale, colFlags, colExtFlags,
+        colFixedOffset, colLength;
+    // One index data entry: unknown bytes before its ten key columns, and around its flags
+    // (after the page map and the first page).
+    size_t realIndexSkip, realIndexBeforeFlags, realIndexAfterFlags;
+    // One logical index entry: its size, the bytes before the index number, the type.
     size_t logicalIndexEntry, logicalSkip, logicalType;
 };
 
-constexpr Layout kJet3 = {12, 16, 21, 23, 25, 27, 31, 35, 43, 8, 18, 0, 1, 3,
-                          11, 12, 13, 0,  14, 16, 0,  8,  0,  0, 20, 0, 19};
-constexpr Layout kJet4 = {16, 20, 41, 43, 45, 47, 51, 55, 63, 12, 25, 0, 5, 7,
-                          11, 12, 15, 16, 21, 23, 4,  8,  4,  5,  28, 4, 23};
+constexpr Layout kJet3 = {.rowCount = 12,
+                          .autoNumber = 16,
+                          .varCols = 23,
+                          .numCols = 25,
+                          .numIndexes = 27,
+                          .numRealIndexes = 31,
+                          .ownedPages = 35,
+                          .headerEnd = 43,
+                          .realIndexCount = 8,
+                          .columnEntry = 18,
+                          .colNumber = 1,
+                          .colVarIndex = 3,
+                          .colPrecision = 11,
+                          .colScale = 12,
+                          .colFlags = 13,
+                          .colExtFlags = 0,
+                          .colFixedOffset = 14,
+                          .colLength = 16,
+                          .realIndexSkip = 0,
+                          .realIndexBeforeFlags = 0,
+                          .realIndexAfterFlags = 0,
+                          .logicalIndexEntry = 20,
+                          .logicalSkip = 0,
+                          .logicalType = 19};
+constexpr Layout kJet4 = {.rowCount = 16,
+                          .autoNumber = 20,
+                          .varCols = 43,
+                          .numCols = 45,
+                          .numIndexes = 47,
+                          .numRealIndexes = 51,
+                          .ownedPages = 55,
+                          .headerEnd = 63,
+                          .realIndexCount = 12,
+                          .columnEntry = 25,
+                          .colNumber = 5,
+                          .colVarIndex = 7,
+                          .colPrecision = 11,
+                          .colScale = 12,
+                          .colFlags = 15,
+                          .colExtFlags = 16,
+                          .colFixedOffset = 21,
+                          .colLength = 23,
+                          .realIndexSkip = 4,
+                          .realIndexBeforeFlags = 4,
+                          .realIndexAfterFlags = 5,
+                          .logicalIndexEntry = 28,
+                          .logicalSkip = 4,
+                          .logicalType = 23};
 
 constexpr uint8_t kFlagFixed = 0x01;
 constexpr uint8_t kFlagAutoLong = 0x04;
@@ -154,7 +204,7 @@ OxJetTableDef OxJetTableDefReader::read(const OxJetPageFile& file, uint32_t page
     def.columns.resize(numCols);
     for (OxJetColumn& c : def.columns) {
         const uint8_t* e = v.at(pos, L.columnEntry, L"a column entry");
-        c.type = e[L.colType];
+        c.type = e[0];
         c.number = OxJetBytes::u16(e + L.colNumber);
         c.varIndex = OxJetBytes::u16(e + L.colVarIndex);
         c.fixedOffset = OxJetBytes::u16(e + L.colFixedOffset);
