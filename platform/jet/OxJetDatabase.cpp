@@ -99,7 +99,7 @@ void OxJetDatabase::readCatalog() {
     if (id < 0 || name < 0 || type < 0)
         throw OxJetError(L"the catalog lacks its Id, Name or Type column (damaged file)");
     std::vector<bool> wanted(def->columns.size(), false);
-    for (int col : {id, parent, name, type, flags, database, connect, foreign, props})
+    for (int col : {id, parent, name, type, flags, database, connect, foreign})
         if (col >= 0)
             wanted[static_cast<size_t>(col)] = true;
 
@@ -143,14 +143,39 @@ void OxJetDatabase::readCatalog() {
         e.linkedDatabase = textOf(at(database));
         e.connect = textOf(at(connect));
         e.foreignName = textOf(at(foreign));
-        if (at(props).kind == OxJetValue::Binary)
-            e.propertyBlob = at(props).bytes;
         m_catalog.push_back(std::move(e));
     }
     if (cursor.failed())
         throw OxJetError(L"the catalog cannot be read: " + cursor.error());
     m_catalogSkipped = cursor.skippedRows() + cursor.skippedPages();
     m_catalogSkipReason = cursor.firstSkipReason();
+    if (props >= 0)
+        readProperties(def, id, props);
+}
+
+// The stored properties in a pass of their own: a damaged property value costs the
+// properties (defaults, Required), not the object.
+void OxJetDatabase::readProperties(std::shared_ptr<const OxJetTableDef> def, int id, int props) {
+    std::vector<bool> wanted(def->columns.size(), false);
+    wanted[static_cast<size_t>(id)] = wanted[static_cast<size_t>(props)] = true;
+    OxJetRowCursor cursor(m_file, std::move(def), m_codePage, OxJetBadRows::Skip);
+    cursor.selectColumns(wanted);
+    while (cursor.next()) {
+        const OxJetValue& blob = cursor.value(static_cast<size_t>(props));
+        if (blob.kind != OxJetValue::Binary)
+            continue;
+        const int32_t objectId = static_cast<int32_t>(integerOf(cursor.value(size_t(id))));
+        for (OxJetCatalogEntry& e : m_catalog)
+            if (e.id == objectId)
+                e.propertyBlob = blob.bytes;
+    }
+    if (cursor.skippedRows() + cursor.skippedPages() == 0 && !cursor.failed())
+        return;
+    // The pass cannot tell whose properties were lost: every table without any is told.
+    const std::wstring why = cursor.failed() ? cursor.error() : cursor.firstSkipReason();
+    for (OxJetCatalogEntry& e : m_catalog)
+        if (e.propertyBlob.empty())
+            e.propertyError = L"its stored properties may be lost: " + why;
 }
 
 const OxJetCatalogEntry* OxJetDatabase::find(std::wstring_view name) const {
@@ -184,6 +209,7 @@ std::shared_ptr<const OxJetTableDef> OxJetDatabase::tableDef(const OxJetCatalogE
     try {
         auto def = std::make_shared<OxJetTableDef>(
             OxJetTableDefReader::read(*m_file, entry.definitionPage, entry.name, m_codePage));
+        def->propertyError = entry.propertyError;
         try {
             OxJetTableDefReader::applyProperties(*def, entry.propertyBlob, header().isJet3(),
                                                  m_codePage);

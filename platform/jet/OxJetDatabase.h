@@ -65,6 +65,7 @@ private:
     static std::shared_ptr<OxJetDatabase> finishOpen(std::shared_ptr<OxJetPageFile> file,
                                                      const OxJetOpenOptions& options);
     void readCatalog();
+    void readProperties(std::shared_ptr<const OxJetTableDef> catalog, int id, int props);
 
     std::shared_ptr<OxJetPageFile> m_file;
     OxJetOpenOptions m_options;

@@ -132,6 +132,7 @@ struct OxJetCatalogEntry {
     std::wstring connect;               // linked tables: the connect string
     std::wstring foreignName;           // linked tables: the table's name in the target
     std::vector<uint8_t> propertyBlob;  // the stored properties, parsed with the definition
+    std::wstring propertyError;         // set when the catalog's properties were damaged
 };
 
 // Short English names ("Text", "Long Integer", "Currency", ...); "Unknown" for other codes.

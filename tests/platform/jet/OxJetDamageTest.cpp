@@ -3,6 +3,7 @@
 // the test instead of stopping the suite.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <random>
 
 #include "JetTestTools.h"
@@ -209,6 +210,33 @@ TEST(OxJetDamage, BrokenRowsAreErrorsOrCounted) {
     while (counted->next()) ++rows;
     EXPECT_EQ(rows, 79u);
     EXPECT_EQ(counted->skippedRows(), 1u);
+}
+
+TEST(OxJetDamage, LostPropertiesCostOnlyTheProperties) {
+    const auto path = JetTest::accessFile("ace14_testV2010.accdb");
+    auto db = JetTest::open(path);
+    ASSERT_TRUE(db);
+    const auto& blob = db->find(L"Table1")->propertyBlob;
+    ASSERT_GT(blob.size(), 64u);
+    auto bytes = bytesOf(path);
+    const auto at = std::search(bytes.begin(), bytes.end(), blob.begin(), blob.begin() + 64);
+    ASSERT_NE(at, bytes.end());
+    const size_t page = size_t(at - bytes.begin()) / 4096;
+    ASSERT_EQ(
+        std::string(bytes.begin() + long(page * 4096 + 4), bytes.begin() + long(page * 4096 + 8)),
+        "LVAL")
+        << "the blob lives on a long-value page";
+    bytes[page * 4096] = 0;  // no longer a data page
+
+    std::wstring error;
+    auto damaged = OxJetDatabase::openBuffer(bytes, {}, error);
+    ASSERT_TRUE(damaged) << OxText::toUtf8(error);
+    auto def = damaged->tableDef(L"Table1", error);
+    ASSERT_TRUE(def) << OxText::toUtf8(error);
+    EXPECT_NE(def->propertyError.find(L"properties"), std::wstring::npos)
+        << OxText::toUtf8(def->propertyError);
+    EXPECT_FALSE(def->column(L"C")->defaultValue);
+    EXPECT_EQ(JetTest::readAll(*damaged, L"Table1").size(), 2u);
 }
 
 TEST(OxJetDamage, TruncatedFileOnDisk) {
