@@ -91,7 +91,7 @@ std::wstring columnList(const std::vector<std::pair<std::wstring, std::wstring>>
 
 int printSchema(const OxJetDatabase& db, const OxJetTableDef& def) {
     Out out;
-    out.line(oxFormat(L"table %s (%u rows)", def.name, def.rowCount));
+    out.line(L"table " + def.name);
     out.line(L"columns:");
     for (const OxJetColumn& c : def.columns) {
         std::wstring line = L"  " + c.name + L"\t" + columnType(c);
