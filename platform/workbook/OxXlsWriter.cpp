@@ -463,6 +463,13 @@ std::string OxXlsWriter::globals(const std::vector<uint32_t>& sheetOffsets) cons
                     n = sst.room() / width;
                 }
                 n = n < s.size() - done ? n : s.size() - done;
+                // Keep a surrogate pair in one record: readers decode each piece alone.
+                if (done + n < s.size() && s[done + n - 1] >= 0xD800 && s[done + n - 1] <= 0xDBFF &&
+                    --n == 0) {
+                    sst.start(0x003C);
+                    put8(g, 1);
+                    continue;
+                }
                 putChars(g, s, done, n, wide);
                 done += n;
             }
