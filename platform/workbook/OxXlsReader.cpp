@@ -209,14 +209,17 @@ OxXlsReader::OxXlsReader(std::unique_ptr<OxWorkbookSource> source) : m_source(st
 
 OxXlsReader::~OxXlsReader() = default;
 
-bool OxXlsReader::readRecord(size_t pos, Record& rec) const {
+bool OxXlsReader::readRecord(size_t pos, Record& rec, bool strict) const {
     if (pos + 4 > m_stream.size())
         return false;
     rec.type = u16(m_stream.data() + pos);
     rec.size = u16(m_stream.data() + pos + 2);
     rec.offset = pos + 4;
-    if (rec.offset + rec.size > m_stream.size())
+    if (rec.offset + rec.size > m_stream.size()) {
+        if (!strict)
+            return false;
         corrupt(L"a record runs past the end of the workbook stream (truncated file?)");
+    }
     return true;
 }
 
@@ -401,16 +404,17 @@ void OxXlsReader::parseGlobals() {
 
     // Substreams follow the globals; a BOUNDSHEET offset that misses a BOF falls back to
     // the substream in the same position.
+    // A truncated last sheet is reported when it is read, not here.
     std::vector<size_t> starts;
     size_t p = pos;
-    while (readRecord(p, rec)) {
+    while (readRecord(p, rec, false)) {
         if (rec.type != kBof) {
             p = rec.offset + rec.size;
             continue;
         }
         starts.push_back(p);
         int depth = 0;
-        while (readRecord(p, rec)) {
+        while (readRecord(p, rec, false)) {
             p = rec.offset + rec.size;
             if (rec.type == kBof)
                 ++depth;
@@ -425,12 +429,12 @@ void OxXlsReader::parseGlobals() {
         allNames.push_back(b.name);
         size_t start = SIZE_MAX;
         Record at{};
-        if (b.offset < m_stream.size() && readRecord(b.offset, at) && at.type == kBof)
+        if (b.offset < m_stream.size() && readRecord(b.offset, at, false) && at.type == kBof)
             start = b.offset;
         else if (i < starts.size())
             start = starts[i];
         bool worksheet = b.kind == 0 && start != SIZE_MAX;
-        if (worksheet && readRecord(start, at) && at.size >= 4) {
+        if (worksheet && readRecord(start, at, false) && at.size >= 4) {
             const uint16_t dt = u16(m_stream.data() + at.offset + 2);
             worksheet = dt == 0x0010 || dt == 0x0000;
         }

@@ -36,7 +36,7 @@ private:
     struct Sheet {
         size_t start;  // offset of its BOF
     };
-    bool readRecord(size_t pos, Record& rec) const;
+    bool readRecord(size_t pos, Record& rec, bool strict = true) const;
     std::vector<Segment> continued(const Record& first, size_t& next) const;
     void parseGlobals();
     void parseSst(const std::vector<Segment>& segments);
