@@ -497,7 +497,9 @@ void OxXlsReader::parseSst(const std::vector<Segment>& segments) {
     in.skip(8);  // total and unique counts: often wrong, so the strings themselves decide
     m_sstStart.clear();
     m_sstPool.clear();
+    m_sstPool.reserve(in.remainingTotal());
     m_sstStart.push_back(0);
+    std::wstring text;
     while (!in.atEnd()) {
         const uint16_t cch = in.word();
         const uint8_t flags = in.byte();
@@ -507,7 +509,9 @@ void OxXlsReader::parseSst(const std::vector<Segment>& segments) {
             runs = in.word();
         if (flags & 0x04)
             ext = in.dword();
-        in.chars(cch, (flags & 1) != 0, m_sstPool);
+        text.clear();
+        in.chars(cch, (flags & 1) != 0, text);
+        OxText::appendUtf8(m_sstPool, text);
         in.endString();
         // Formatting runs and phonetic text are not part of the value.
         in.skip(static_cast<uint64_t>(runs) * 4 + ext);
@@ -636,10 +640,10 @@ bool OxXlsReader::doNextRow(OxWorkbookRow& out) {
                                          L"strings",
                                          cellRef(row, col), isst, count));
                         const size_t a = m_sstStart[isst];
-                        emitted |= addCell(row,
-                                           OxWorkbookCell::makeText(
-                                               col, m_sstPool.substr(a, m_sstStart[isst + 1] - a)),
-                                           out);
+                        OxWorkbookCell text = OxWorkbookCell::makeText(col, {});
+                        OxText::appendFromUtf8(text.text, std::string_view(m_sstPool).substr(
+                                                              a, m_sstStart[isst + 1] - a));
+                        emitted |= addCell(row, std::move(text), out);
                     }
                     break;
                 case kLabel:

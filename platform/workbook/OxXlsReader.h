@@ -57,7 +57,7 @@ private:
     OxWorkbookCodepage* m_codepage = nullptr;
     std::unique_ptr<OxWorkbookCodepage> m_codepageOwner;
     std::vector<bool> m_xfIsDate;
-    std::wstring m_sstPool;
+    std::string m_sstPool;           // the shared strings as UTF-8, end to end: compact
     std::vector<size_t> m_sstStart;  // n+1 offsets into m_sstPool
     std::vector<Sheet> m_sheets;
 

@@ -7,6 +7,7 @@
 #include <charconv>
 #include <cmath>
 #include <cstring>
+#include <exception>
 #include <functional>
 
 #include "platform/core/OxFormat.h"
@@ -17,7 +18,7 @@ namespace {
 constexpr size_t kChunk = 1 << 16;
 constexpr size_t kMaxSmallPart = 256u << 20;  // workbook, rels, styles
 constexpr size_t kMaxText = 64u << 20;        // one cell's text, in bytes
-constexpr size_t kMaxStrings = 1024u << 20;   // all shared strings, in characters
+constexpr size_t kMaxStrings = 2048u << 20;   // all shared strings, in UTF-8 bytes
 constexpr uint32_t kMaxRows = 1048576;
 constexpr uint32_t kMaxColumns = 16384;
 
@@ -138,11 +139,16 @@ public:
         XML_SetElementHandler(
             m_parser,
             [](void* u, const XML_Char* n, const XML_Char** a) {
-                static_cast<XmlParser*>(u)->m_start(n, a);
+                auto* self = static_cast<XmlParser*>(u);
+                self->guard([&] { self->m_start(n, a); });
             },
-            [](void* u, const XML_Char* n) { static_cast<XmlParser*>(u)->m_end(n); });
+            [](void* u, const XML_Char* n) {
+                auto* self = static_cast<XmlParser*>(u);
+                self->guard([&] { self->m_end(n); });
+            });
         XML_SetCharacterDataHandler(m_parser, [](void* u, const XML_Char* s, int len) {
-            static_cast<XmlParser*>(u)->m_text(s, len);
+            auto* self = static_cast<XmlParser*>(u);
+            self->guard([&] { self->m_text(s, len); });
         });
         XML_SetStartDoctypeDeclHandler(
             m_parser, [](void* u, const XML_Char*, const XML_Char*, const XML_Char*, int) {
@@ -156,7 +162,10 @@ public:
     XmlParser& operator=(const XmlParser&) = delete;
 
     void feed(const char* data, size_t len, bool last, const std::string& part) {
-        if (XML_Parse(m_parser, data, static_cast<int>(len), last ? 1 : 0) != XML_STATUS_OK) {
+        const XML_Status status = XML_Parse(m_parser, data, static_cast<int>(len), last ? 1 : 0);
+        if (m_failure)
+            std::rethrow_exception(m_failure);
+        if (status != XML_STATUS_OK) {
             if (m_doctype)
                 corrupt(
                     oxFormat(L"%s declares a document type, which a workbook never does", part));
@@ -167,7 +176,22 @@ public:
     }
 
 private:
+    // Exceptions must not cross expat's C frames: the handler's failure stops the parser
+    // and is thrown again once XML_Parse has returned.
+    template <class F>
+    void guard(F&& f) {
+        if (m_failure)
+            return;
+        try {
+            f();
+        } catch (...) {
+            m_failure = std::current_exception();
+            XML_StopParser(m_parser, XML_FALSE);
+        }
+    }
+
     XML_Parser m_parser;
+    std::exception_ptr m_failure;
     Start m_start;
     End m_end;
     Text m_text;
@@ -354,8 +378,9 @@ struct OxXlsxReader::SheetParser {
                 corrupt(oxFormat(L"cell %s of %s refers to string %s, past the %d shared strings",
                                  cellName(), part, value, count));
             cell.type = OxWorkbookCell::Text;
-            cell.text =
-                shared.pool.substr(shared.starts[i], shared.starts[i + 1] - shared.starts[i]);
+            OxText::appendFromUtf8(
+                cell.text, std::string_view(shared.pool)
+                               .substr(shared.starts[i], shared.starts[i + 1] - shared.starts[i]));
         } else if (t == "str" || t == "inlineStr") {
             cell.type = OxWorkbookCell::Text;
             OxText::appendFromUtf8(cell.text, value);
@@ -680,7 +705,7 @@ void OxXlsxReader::doOpen() {
                     if (m_shared.pool.size() + item.size() > kMaxStrings)
                         OxWorkbookError::raise(OxWorkbookError::Limit,
                                                L"the workbook's shared strings are too large");
-                    m_shared.pool += item;
+                    OxText::appendUtf8(m_shared.pool, item);
                     m_shared.starts.push_back(m_shared.pool.size());
                 }
             },

@@ -22,7 +22,7 @@ public:
 
     // What the sheet parser needs from the workbook: strings and date formats.
     struct Shared {
-        std::wstring pool;
+        std::string pool;  // UTF-8, end to end
         std::vector<size_t> starts{0};
         std::vector<bool> xfIsDate;
         bool date1904 = false;
