@@ -406,3 +406,24 @@ TEST(WorkbookWriteXlsx, DatesOfA1904WorkbookKeepTheirDay) {
                 << name;
     }
 }
+
+TEST(WorkbookWriteXls, TinyWorkbookLivesInTheMiniStream) {
+    // Readers insist that a workbook stream under 4096 bytes sits in the mini stream.
+    OxTest::TempDir dir;
+    const fs::path file = dir.file("tiny.xls");
+    OxWorkbook wb;
+    OxWorkbookSheet s;
+    s.info.name = L"T";
+    s.rows.push_back(rowOf(0, {text(L"a"), num(1)}));
+    wb.sheets.push_back(s);
+    OxWorkbookError error;
+    ASSERT_TRUE(wb.save(file.wstring(), OxWorkbookInfo::Xls, error));
+    OxWorkbookSource src;
+    ASSERT_TRUE(src.openFile(file.wstring(), error));
+    OxCompoundFileReader cfb;
+    ASSERT_TRUE(cfb.open(src, error));
+    std::string stream;
+    ASSERT_TRUE(cfb.readRootStream(L"Workbook", stream, error));
+    EXPECT_LT(stream.size(), 4096u);
+    expectReadersAgree(file);
+}
