@@ -3,14 +3,13 @@
 #include <string>
 #include <vector>
 
-#include "platform/core/OxExport.h"
 #include "platform/workbook/OxWorkbookError.h"
 #include "platform/workbook/OxWorkbookInfo.h"
 #include "platform/workbook/OxWorkbookSheet.h"
 
 // A whole workbook in memory, for callers that edit and write back; large files are
 // better read and written through OxWorkbookReader and OxWorkbookWriter directly.
-class OX_EXPORT OxWorkbook {
+class OxWorkbook {
 public:
     bool date1904 = false;
     std::vector<OxWorkbookSheet> sheets;

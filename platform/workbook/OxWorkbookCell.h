@@ -5,12 +5,11 @@
 #include <string_view>
 
 #include "platform/core/OxDateTime.h"
-#include "platform/core/OxExport.h"
 
 // One cell value as workbooks hold it. Dates are numbers whose number format shows them
 // as dates: `number` keeps the serial in the workbook's own date system (1900 or 1904)
 // and the type says Date, so callers build an OxDateTime with toDateTime(date1904).
-class OX_EXPORT OxWorkbookCell {
+class OxWorkbookCell {
 public:
     enum Type : uint8_t { Empty = 0, Number, Text, Boolean, Error, Date };
 

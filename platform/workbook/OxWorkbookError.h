@@ -2,11 +2,9 @@
 
 #include <string>
 
-#include "platform/core/OxExport.h"
-
 // Why a workbook could not be read or written. Readers and writers never throw to their
 // callers: they answer false and keep one of these.
-class OX_EXPORT OxWorkbookError {
+class OxWorkbookError {
 public:
     enum Code {
         None = 0,

@@ -4,7 +4,6 @@
 #include <memory>
 #include <string>
 
-#include "platform/core/OxExport.h"
 #include "platform/workbook/OxWorkbookError.h"
 #include "platform/workbook/OxWorkbookInfo.h"
 #include "platform/workbook/OxWorkbookRow.h"
@@ -14,7 +13,7 @@
 //   auto r = OxWorkbookReader::open(path, error);
 //   r->beginSheet(0); while (r->nextRow(row)) ...; if (r->error()) ...
 // No call throws; after a failure error() says why and every later read answers false.
-class OX_EXPORT OxWorkbookReader {
+class OxWorkbookReader {
 public:
     virtual ~OxWorkbookReader();
 

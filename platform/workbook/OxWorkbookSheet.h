@@ -3,12 +3,11 @@
 #include <cstdint>
 #include <vector>
 
-#include "platform/core/OxExport.h"
 #include "platform/workbook/OxWorkbookInfo.h"
 #include "platform/workbook/OxWorkbookRow.h"
 
 // One worksheet held in memory: its rows (ascending, non-empty ones only) and cells.
-class OX_EXPORT OxWorkbookSheet {
+class OxWorkbookSheet {
 public:
     OxWorkbookSheetInfo info;
     std::vector<OxWorkbookRow> rows;

@@ -5,7 +5,6 @@
 #include <string>
 #include <vector>
 
-#include "platform/core/OxExport.h"
 #include "platform/workbook/OxWorkbookError.h"
 #include "platform/workbook/OxWorkbookInfo.h"
 #include "platform/workbook/OxWorkbookRow.h"
@@ -16,7 +15,7 @@
 // The file appears under its name only when commit() succeeds; a writer dropped before
 // that, or after any failure, leaves the target as it was. No call throws. Date cells hold
 // serials of the 1900 date system; one that system cannot show is written as a number.
-class OX_EXPORT OxWorkbookWriter {
+class OxWorkbookWriter {
 public:
     virtual ~OxWorkbookWriter();
 

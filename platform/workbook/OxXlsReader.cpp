@@ -36,6 +36,9 @@ enum : uint16_t {
     kBof = 0x0809,
 };
 
+constexpr size_t kMaxRowCells = 65536;
+constexpr size_t kMaxRowText = 16u << 20;  // characters; 256 full cells hold 8 million
+
 uint16_t u16(const char* p) {
     return static_cast<uint16_t>(static_cast<uint8_t>(p[0]) | static_cast<uint8_t>(p[1]) << 8);
 }
@@ -569,7 +572,15 @@ bool OxXlsReader::addCell(uint32_t row, OxWorkbookCell&& cell, OxWorkbookRow& ou
         m_haveRow = true;
         m_row.index = row;
         m_sorted = true;
+        m_rowText = 0;
     }
+    // A hostile file can point many cells of one row at long strings: bound the row.
+    m_rowText += cell.text.size();
+    if (m_row.cells.size() >= kMaxRowCells || m_rowText > kMaxRowText)
+        OxWorkbookError::raise(
+            OxWorkbookError::Limit,
+            oxFormat(L"row %d holds more cells or text than this reader takes in one row",
+                     static_cast<unsigned long long>(row) + 1));
     if (!m_row.cells.empty() && m_row.cells.back().column >= cell.column)
         m_sorted = false;
     m_row.cells.push_back(std::move(cell));

@@ -71,5 +71,6 @@ private:
     bool m_haveRow = false;
     bool m_sorted = true;
     bool m_sheetDone = false;
+    size_t m_rowText = 0;
     OxWorkbookRow m_row;
 };

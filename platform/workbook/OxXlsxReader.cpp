@@ -19,6 +19,7 @@ constexpr size_t kChunk = 1 << 16;
 constexpr size_t kMaxSmallPart = 256u << 20;  // workbook, rels, styles
 constexpr size_t kMaxText = 64u << 20;        // one cell's text, in bytes
 constexpr size_t kMaxStrings = 2048u << 20;   // all shared strings, in UTF-8 bytes
+constexpr size_t kMaxRowText = 64u << 20;     // characters in one row
 constexpr uint32_t kMaxRows = 1048576;
 constexpr uint32_t kMaxColumns = 16384;
 
@@ -294,6 +295,7 @@ struct OxXlsxReader::SheetParser {
             current.index = rowIndex;
             current.cells.clear();
             sorted = true;
+            rowText = 0;
         } else if (std::strcmp(l, "c") == 0) {
             uint32_t col = 0, row = 0;
             if (parseRef(attr(atts, "r"), col, row)) {
@@ -420,6 +422,13 @@ struct OxXlsxReader::SheetParser {
             corrupt(oxFormat(L"%s has a cell outside any row", part));
         if (!current.cells.empty() && current.cells.back().column >= cell.column)
             sorted = false;
+        // A compressed part can hold a huge row: bound what one row may take.
+        rowText += cell.text.size();
+        if (current.cells.size() >= 4 * kMaxColumns || rowText > kMaxRowText)
+            OxWorkbookError::raise(OxWorkbookError::Limit,
+                                   oxFormat(L"row %d of %s holds more cells or text than "
+                                            L"this reader takes in one row",
+                                            static_cast<unsigned long long>(rowIndex) + 1, part));
         current.cells.push_back(std::move(cell));
     }
 
@@ -433,6 +442,7 @@ struct OxXlsxReader::SheetParser {
     int rphDepth = 0;
     uint32_t rowIndex = 0, nextCol = 0, cellCol = 0;
     uint64_t cellStyle = 0;
+    size_t rowText = 0;
     std::string cellType;
     std::string value;
     bool done = false;

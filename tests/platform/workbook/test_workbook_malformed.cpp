@@ -350,3 +350,27 @@ TEST(WorkbookOdd, MutatedRealFilesNeverCrash) {
         }
     }
 }
+
+TEST(WorkbookXlsOdd, RowsThatWouldExhaustMemoryAreRefused) {
+    // One 60,000-character string, and a row of 400 cells that all show it.
+    const size_t length = 60000;
+    std::string sst = le32(400) + le32(1) + le16(length) + '\0';
+    std::string records;
+    size_t done = 0;
+    bool first = true;
+    while (done < length) {
+        const size_t room = 8224 - (first ? sst.size() : 1);
+        const size_t n = std::min(room, length - done);
+        records += first ? record(0x00FC, sst + std::string(n, 'x'))
+                         : record(0x003C, '\0' + std::string(n, 'x'));
+        done += n;
+        first = false;
+    }
+    std::string cells;
+    for (uint16_t c = 0; c < 400; ++c) cells += record(0x00FD, cell(0, c, 0) + le32(0));
+    OxWorkbookError error;
+    auto r = openBytes(compoundFile(book(records, cells)), error);
+    ASSERT_TRUE(r) << OxText::toUtf8(error.message());
+    readAll(*r);
+    EXPECT_EQ(r->error().code(), OxWorkbookError::Limit);
+}
