@@ -18,8 +18,9 @@ namespace {
 constexpr size_t kChunk = 1 << 16;
 constexpr size_t kMaxSmallPart = 256u << 20;  // workbook, rels, styles
 constexpr size_t kMaxText = 64u << 20;        // one cell's text, in bytes
-constexpr size_t kMaxStrings = 2048u << 20;   // all shared strings, in UTF-8 bytes
-constexpr size_t kMaxRowText = 64u << 20;     // characters in one row
+constexpr size_t kMaxStrings = 1024u << 20;   // all shared strings, in UTF-8 bytes
+constexpr int kMaxDepth = 256;
+constexpr size_t kMaxRowText = 64u << 20;  // characters in one row
 constexpr uint32_t kMaxRows = 1048576;
 constexpr uint32_t kMaxColumns = 16384;
 
@@ -141,11 +142,19 @@ public:
             m_parser,
             [](void* u, const XML_Char* n, const XML_Char** a) {
                 auto* self = static_cast<XmlParser*>(u);
-                self->guard([&] { self->m_start(n, a); });
+                self->guard([&] {
+                    // Workbook parts nest a few levels; a deep pile is an attack on memory.
+                    if (++self->m_depth > kMaxDepth)
+                        corrupt(L"XML elements are nested too deeply");
+                    self->m_start(n, a);
+                });
             },
             [](void* u, const XML_Char* n) {
                 auto* self = static_cast<XmlParser*>(u);
-                self->guard([&] { self->m_end(n); });
+                self->guard([&] {
+                    --self->m_depth;
+                    self->m_end(n);
+                });
             });
         XML_SetCharacterDataHandler(m_parser, [](void* u, const XML_Char* s, int len) {
             auto* self = static_cast<XmlParser*>(u);
@@ -193,6 +202,7 @@ private:
 
     XML_Parser m_parser;
     std::exception_ptr m_failure;
+    int m_depth = 0;
     Start m_start;
     End m_end;
     Text m_text;

@@ -321,6 +321,12 @@ TEST(WorkbookXlsxOdd, HostileOrBrokenPackagesFailClearly) {
         {"no number", package("<row><c><v>12abc</v></c></row>"), OxWorkbookError::Corrupt},
         {"unclosed", package("<row><c><v>1</v></c>"), OxWorkbookError::Corrupt},
         {"no workbook", xlsx({{"a.txt", "hello"}}), OxWorkbookError::Unsupported},
+        {"deep nesting", package([] {
+             std::string deep;
+             for (int i = 0; i < 5000; ++i) deep += "<x>";
+             return deep;
+         }()),
+         OxWorkbookError::Corrupt},
         {"zip signature only", std::string("PK\x03\x04", 4) + std::string(100, 'x'),
          OxWorkbookError::Corrupt},
     };
