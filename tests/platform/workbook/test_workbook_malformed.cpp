@@ -182,6 +182,7 @@ TEST(WorkbookXlsOdd, CellRecordsFormulasAndDates) {
     // A chart embedded in the sheet: its records are not cells of the sheet.
     cells += bof(0x0020) + number(3, 7, 99) + record(0x000A, "");
     cells += number(4, 0, 7);
+    cells += record(0x0002, le16(4) + le16(1) + std::string(3, '\0') + le16(77));  // INTEGER
 
     OxWorkbookError error;
     auto r = openBytes(compoundFile(book(globals, cells)), error);
@@ -215,8 +216,9 @@ TEST(WorkbookXlsOdd, CellRecordsFormulasAndDates) {
     EXPECT_EQ(dates[4].type, OxWorkbookCell::Number);  // negative: no date
     // 1904 system: serial 40000 is 40000 + 1462 days after 1899-12-30.
     EXPECT_EQ(dates[0].toDateTime(true).serial(), 41462);
-    ASSERT_EQ(rows[4].cells.size(), 1u);
+    ASSERT_EQ(rows[4].cells.size(), 2u);
     EXPECT_EQ(rows[4].index, 4u);
+    EXPECT_EQ(rows[4].cells[1].number, 77);
 }
 
 TEST(WorkbookXlsOdd, EncryptionWrongOffsetsAndTruncation) {
