@@ -52,6 +52,11 @@ int runDump(const OxqelArgs& args) {
     if (args.empty())
         return oxqelFail("dump: no file given");
     const std::string& path = args[0];
+    // "--write OUT IN..." names no file to read: the workbook writer takes it.
+    if (path == "--write")
+        for (const auto& f : OxqelRegistry::dumpFormats())
+            if (f.handles(OxFileInfo::FileMissing, path))
+                return f.run(args);
     const auto type = OxFileInfo::_getFileType(OxUtString::LPCSTR_TO_LPCTSTR(path.c_str()));
     if (type == OxFileInfo::FileMissing)
         return oxqelFail("cannot read " + path);
@@ -61,7 +66,8 @@ int runDump(const OxqelArgs& args) {
     return oxqelFail(path + ": not a file kind that dump reads");
 }
 
-const OxqelRegisterCommand dump({"dump", "FILE [TABLE|SHEET] [--csv|--json|--schema]",
+const OxqelRegisterCommand dump({"dump",
+                                 "FILE [TABLE|SHEET] [--csv|--json|--schema] | --write OUT IN...",
                                  "lists the tables or sheets of a file, or prints one of them",
                                  runDump});
 }  // namespace
