@@ -16,7 +16,8 @@ std::shared_ptr<OxOdbcEnvironment> OxOdbcEnvironment::create() {
     return std::make_shared<OxOdbcEnvironment>();
 }
 
-std::vector<OxOdbcEnvironment::DataSource> OxOdbcEnvironment::dataSources(Scope scope) const {
+std::vector<OxOdbcEnvironment::DataSource> OxOdbcEnvironment::dataSources(SQLHENV env,
+                                                                          Scope scope) {
     std::vector<DataSource> result;
     SQLUSMALLINT direction = scope == Scope::user     ? SQL_FETCH_FIRST_USER
                              : scope == Scope::system ? SQL_FETCH_FIRST_SYSTEM
@@ -26,11 +27,11 @@ std::vector<OxOdbcEnvironment::DataSource> OxOdbcEnvironment::dataSources(Scope 
         SQLCHAR driver[1024] = {};
         SQLSMALLINT nameLength = 0;
         SQLSMALLINT driverLength = 0;
-        const SQLRETURN rc = SQLDataSourcesA(m_env.get(), direction, name, sizeof(name),
-                                             &nameLength, driver, sizeof(driver), &driverLength);
+        const SQLRETURN rc = SQLDataSourcesA(env, direction, name, sizeof(name), &nameLength,
+                                             driver, sizeof(driver), &driverLength);
         if (rc == SQL_NO_DATA)
             break;
-        OxDBException::check(rc, SQL_HANDLE_ENV, m_env.get());
+        OxDBException::check(rc, SQL_HANDLE_ENV, env);
         result.push_back({OxText::fromUtf8(reinterpret_cast<const char*>(name)),
                           OxText::fromUtf8(reinterpret_cast<const char*>(driver))});
         direction = SQL_FETCH_NEXT;

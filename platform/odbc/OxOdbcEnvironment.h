@@ -27,7 +27,11 @@ public:
     SQLHENV henv() const noexcept { return m_env.get(); }
 
     // The data sources the driver manager knows (SQLDataSources), user ones first.
-    std::vector<DataSource> dataSources(Scope scope = Scope::all) const;
+    std::vector<DataSource> dataSources(Scope scope = Scope::all) const {
+        return dataSources(henv(), scope);
+    }
+    // The same on an environment handle of the caller's.
+    static std::vector<DataSource> dataSources(SQLHENV env, Scope scope);
     // The installed drivers (SQLDrivers) by name.
     std::vector<std::wstring> drivers() const;
     // The keys and values of a data source's entry in the odbc.ini files, as written there.
