@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <memory>
 
 #include "OxQelLib/odbc/OxQelConnectionODBC.h"
 #include "platform/core/OxFormat.h"
@@ -17,12 +18,13 @@ public:
         if (::tcgetattr(fd, &m_saved) == 0) {
             termios quiet = m_saved;
             quiet.c_lflag &= static_cast<tcflag_t>(~ECHO);
-            m_active = ::tcsetattr(fd, TCSAFLUSH, &quiet) == 0;
+            // TCSANOW: an answer typed ahead must not be thrown away.
+            m_active = ::tcsetattr(fd, TCSANOW, &quiet) == 0;
         }
     }
     ~EchoOff() {
         if (m_active)
-            ::tcsetattr(m_fd, TCSAFLUSH, &m_saved);
+            ::tcsetattr(m_fd, TCSANOW, &m_saved);
     }
     EchoOff(const EchoOff&) = delete;
     EchoOff& operator=(const EchoOff&) = delete;
@@ -54,13 +56,7 @@ void OxQelODBCTerminalDialog::write(const std::wstring& text) {
     }
 }
 
-bool OxQelODBCTerminalDialog::readLine(std::wstring& line, bool hidden) {
-    EchoOff* quiet = nullptr;
-    std::unique_ptr<EchoOff> guard;
-    if (hidden && ::isatty(m_in)) {
-        guard = std::make_unique<EchoOff>(m_in);
-        quiet = guard.get();
-    }
+bool OxQelODBCTerminalDialog::readLine(std::wstring& line) {
     // Byte by byte, so that nothing after the line is taken from the terminal.
     std::string bytes;
     bool gotLine = false;
@@ -78,15 +74,20 @@ bool OxQelODBCTerminalDialog::readLine(std::wstring& line, bool hidden) {
         if (c != '\r')
             bytes.push_back(c);
     }
-    if (quiet)
-        write(L"\n");  // the user's Enter was not echoed
     line = OxText::fromUtf8(bytes);
     return gotLine || !bytes.empty();
 }
 
 bool OxQelODBCTerminalDialog::ask(const std::wstring& prompt, std::wstring& answer, bool hidden) {
+    // The echo goes off before the prompt shows, so no typed character is ever echoed.
+    std::unique_ptr<EchoOff> quiet;
+    if (hidden && ::isatty(m_in))
+        quiet = std::make_unique<EchoOff>(m_in);
     write(prompt);
-    return readLine(answer, hidden);
+    const bool answered = readLine(answer);
+    if (quiet)
+        write(L"\n");  // the user's Enter was not echoed
+    return answered;
 }
 
 std::wstring OxQelODBCTerminalDialog::run(const std::vector<DataSource>& sources,

@@ -22,9 +22,10 @@ public:
                      Attributes (*attributes)(const std::wstring& dataSource));
 
 private:
-    // False at the end of input; hidden switches the terminal's echo off.
-    bool readLine(std::wstring& line, bool hidden = false);
+    // False at the end of input.
+    bool readLine(std::wstring& line);
     void write(const std::wstring& text);
+    // hidden switches the terminal's echo off for the answer.
     bool ask(const std::wstring& prompt, std::wstring& answer, bool hidden = false);
 
     int m_in;

@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <poll.h>
 #include <pty.h>
+#include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -41,10 +42,21 @@ void writeAll(int fd, const std::string& text) {
     }
 }
 
-std::string readAll(int fd) {
+// Everything until the writer closes, or what came within the time.
+std::string readAll(int fd, std::chrono::seconds within = std::chrono::seconds(30)) {
     std::string text;
     char buffer[4096];
-    for (ssize_t n; (n = ::read(fd, buffer, sizeof(buffer))) > 0;) text.append(buffer, n);
+    const auto deadline = std::chrono::steady_clock::now() + within;
+    while (std::chrono::steady_clock::now() < deadline) {
+        pollfd p{fd, POLLIN, 0};
+        if (::poll(&p, 1, 200) <= 0)
+            continue;
+        const ssize_t n = ::read(fd, buffer, sizeof(buffer));
+        if (n <= 0)
+            return text;
+        text.append(buffer, n);
+    }
+    ADD_FAILURE() << "the chooser's process did not finish";
     return text;
 }
 
@@ -104,6 +116,7 @@ ChooserRun runOnTerminal(const std::vector<Step>& steps) {
         writeAll(master, step.answer + "\n");
     }
     const std::string output = readAll(result[0]);
+    ::kill(pid, SIGKILL);  // gone already, unless it hangs
     // The rest of the screen, read until the child's side closes.
     for (;;) {
         pollfd p{master, POLLIN, 0};
@@ -137,6 +150,7 @@ ChooserRun runWithoutTerminal() {
     }
     ::close(result[1]);
     const std::string output = readAll(result[0]);
+    ::kill(pid, SIGKILL);
     ::close(result[0]);
     int status = 0;
     ::waitpid(pid, &status, 0);
