@@ -28,13 +28,56 @@ OxDatabase* OxQelConnectionODBC::ensureDatabase() {
 }
 
 namespace {
-// An argument's value in braces when it would otherwise end at a ";" or read as braced.
+// "{...}" with every "}" inside doubled: a value the driver reads back unchanged.
+bool isBraced(const std::wstring& value) {
+    if (value.size() < 2 || value.front() != L'{' || value.back() != L'}')
+        return false;
+    for (size_t i = 1; i + 1 < value.size(); ++i) {
+        if (value[i] != L'}')
+            continue;
+        if (i + 2 >= value.size() || value[i + 1] != L'}')
+            return false;
+        ++i;
+    }
+    return true;
+}
+
+// The value in braces when it would otherwise end early (at a ";") or open a braced value
+// that swallows the pairs after it (a "{" that is not closed).
 std::wstring connectValue(const std::wstring& value) {
-    if (value.find(L';') == std::wstring::npos && (value.empty() || value.front() != L'{'))
+    if (isBraced(value) ||
+        (value.find(L';') == std::wstring::npos && (value.empty() || value.front() != L'{')))
         return value;
     std::wstring braced = value;
     OxText::replaceAll(braced, L"}", L"}}");
     return L"{" + braced + L"}";
+}
+
+std::vector<std::wstring> connectPairs(const std::wstring& database, const std::wstring& host,
+                                       const std::wstring& userId, const std::wstring& password) {
+    OxConnectionString connect(host);
+    connect.explode();
+    if (!database.empty())
+        connect.setAt(L"DATABASE", database);
+    if (!userId.empty())
+        connect.setAt(L"UID", userId);
+    if (!password.empty())
+        connect.setAt(L"PWD", password);
+    std::vector<std::wstring> pairs;
+    for (const auto& [key, value] : connect.map())
+        pairs.push_back(key + L"=" + connectValue(value));
+    return pairs;
+}
+
+std::wstring joined(const std::vector<std::wstring>& pairs, bool masked) {
+    std::wstring text;
+    for (const std::wstring& pair : pairs) {
+        if (!text.empty())
+            text += L';';
+        // Pair by pair, so that no quoting in another value can hide a password.
+        text += masked ? OxConnectionString::_maskPasswords(pair) : pair;
+    }
+    return text;
 }
 }  // namespace
 
@@ -42,42 +85,25 @@ std::wstring OxQelConnectionODBC::_composeConnectString(const std::wstring& data
                                                         const std::wstring& host,
                                                         const std::wstring& userId,
                                                         const std::wstring& password) {
-    OxConnectionString connect(host);
-    connect.explode();
-    if (!database.empty())
-        connect.setAt(L"DATABASE", connectValue(database));
-    if (!userId.empty())
-        connect.setAt(L"UID", connectValue(userId));
-    if (!password.empty())
-        connect.setAt(L"PWD", connectValue(password));
-    std::wstring text;
-    for (const auto& [key, value] : connect.map()) {
-        if (!text.empty())
-            text += L';';
-        text += key;
-        text += L'=';
-        text += value;
-    }
-    return text;
+    return joined(connectPairs(database, host, userId, password), false);
 }
 
 bool OxQelConnectionODBC::openConnection(const std::wstring& database, const std::wstring& host,
                                          const std::wstring& userId, const std::wstring& password) {
     bool result = false;
-    std::wstring connect;
+    std::vector<std::wstring> pairs;
     try {
         if (isOpen())
             closeDatabase();
         OxDatabase* db = ensureDatabase();
         db->setLoginTimeout(OxQel::_lConnectionTimeout);
         db->setQueryTimeout(OxQel::_lCommandTimeout);
-        connect = _composeConnectString(database, host, userId, password);
-        db->open(connect);
+        pairs = connectPairs(database, host, userId, password);
+        db->open(joined(pairs, false));
         result = true;
     } catch (...) {
         // The report names the connection string, never its credentials.
-        OXQEL_ODBC_REPORT(L"OxQelConnectionODBC::openConnection",
-                          OxConnectionString::_maskPasswords(connect));
+        OXQEL_ODBC_REPORT(L"OxQelConnectionODBC::openConnection", joined(pairs, true));
     }
     m_inTransaction = false;
     m_parameters.clear();

@@ -105,7 +105,7 @@ public:
 
     // The connection string openConnection composes: the host's pairs with DATABASE, UID
     // and PWD set from the non-empty arguments, joined by ";" (drivers here read no key
-    // after "; "). Values that would end early are braced.
+    // after "; "). Values that would end early, or open a brace they do not close, are braced.
     static std::wstring _composeConnectString(const std::wstring& database,
                                               const std::wstring& host, const std::wstring& userId,
                                               const std::wstring& password);

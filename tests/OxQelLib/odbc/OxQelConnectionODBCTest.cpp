@@ -36,13 +36,21 @@ TEST(OdbcConnectString, ArgumentsReplaceTheirKeysAndPairsAreJoinedWithoutBlanks)
     EXPECT_NE(OxQelConnectionODBC::_composeConnectString(L"{x", L"", L"", L"").find(L"{{x}"),
               std::wstring::npos);
     EXPECT_TRUE(OxQelConnectionODBC::_composeConnectString(L"", L"", L"", L"").empty());
+    // A host value that opens a brace without closing it would swallow the pairs after it.
+    const std::wstring unclosed =
+        OxQelConnectionODBC::_composeConnectString(L"", L"A={x;B={y}}z}", L"", L"pw");
+    EXPECT_NE(unclosed.find(L"A={{x}"), std::wstring::npos) << OxText::toUtf8(unclosed);
+    EXPECT_NE(unclosed.find(L"B={y}}z}"), std::wstring::npos) << OxText::toUtf8(unclosed);
 }
 
 TEST(OdbcConnection, FailedOpenIsReportedWithoutThePassword) {
     OdbcTest::Env::get();
     Reports reports;
     OxQelConnectionODBC c;
-    EXPECT_FALSE(c.openConnection(L"db", L"DRIVER={No Such Driver};SERVER=s", L"u", L"s3cret"));
+    // Neither a quote nor an unclosed brace in another value may hide the password (enough
+    // of them that some come before the password, whatever the order of the pairs).
+    const std::wstring host = L"DRIVER={No Such Driver};A=\"a;B={b;C='c;D={d;E=\"e;F={f;G={g";
+    EXPECT_FALSE(c.openConnection(L"db", host, L"u", L"s3cret"));
     EXPECT_FALSE(c.isOpen());
     EXPECT_NE(reports.text().find(L"OxQelConnectionODBC::openConnection"), std::wstring::npos);
     EXPECT_NE(reports.text().find(L"PWD=***"), std::wstring::npos)
@@ -53,6 +61,7 @@ TEST(OdbcConnection, FailedOpenIsReportedWithoutThePassword) {
     EXPECT_EQ(p.getDatabase(), L"db");
     EXPECT_EQ(p.getPassword(), L"s3cret");
     EXPECT_EQ(p.getDriverName(), L"{No Such Driver}");
+    EXPECT_EQ(p.getHost(), host);
 }
 
 TEST(OdbcConnection, WithoutADatabaseObjectEverythingFailsQuietly) {
