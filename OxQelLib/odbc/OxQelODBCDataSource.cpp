@@ -4,6 +4,7 @@
 #include <sqlext.h>
 #include <unistd.h>
 
+#include "OxQelLib/foundation/OxQelLog.h"
 #include "OxQelLib/odbc/OxQelODBCTerminalDialog.h"
 #include "platform/core/OxFormat.h"
 #include "platform/core/OxMessageSink.h"
@@ -34,7 +35,8 @@ struct Terminal {
 };
 }  // namespace
 
-bool selectODBCDataSource(std::wstring& connectionString, void*) {
+namespace {
+bool chooseOnTerminal(std::wstring& connectionString) {
     OxOdbcHandle env;
     try {
         env = OxOdbcHandle(SQL_HANDLE_ENV, SQL_NULL_HANDLE);
@@ -85,5 +87,15 @@ bool selectODBCDataSource(std::wstring& connectionString, void*) {
     if (SQL_SUCCEEDED(rc))
         SQLDisconnect(dbc.get());
     return !connectionString.empty();
+}
+}  // namespace
+
+bool selectODBCDataSource(std::wstring& connectionString, void*) {
+    try {
+        return chooseOnTerminal(connectionString);
+    } catch (...) {
+        OxMessageSink::show(OxQel::Util::currentExceptionText());
+        return false;
+    }
 }
 }  // namespace OxQel::ODBC

@@ -39,8 +39,17 @@ void OxOdbcDatabase::open(const std::wstring& connectString) {
     m_connected = true;
     m_inTransaction = false;
     m_connect = OxText::fromUtf8(out.c_str());
-    m_canTransact = getInfoUShort(SQL_TXN_CAPABLE) != SQL_TC_NONE;
-    m_getDataAnyOrder = (getInfoUInt(SQL_GETDATA_EXTENSIONS) & SQL_GD_ANY_ORDER) != 0;
+    // A driver that does not answer is taken at its least: no transactions, reads in order.
+    try {
+        m_canTransact = getInfoUShort(SQL_TXN_CAPABLE) != SQL_TC_NONE;
+    } catch (const OxDBException&) {
+        m_canTransact = false;
+    }
+    try {
+        m_getDataAnyOrder = (getInfoUInt(SQL_GETDATA_EXTENSIONS) & SQL_GD_ANY_ORDER) != 0;
+    } catch (const OxDBException&) {
+        m_getDataAnyOrder = false;
+    }
 }
 
 void OxOdbcDatabase::close() noexcept {
