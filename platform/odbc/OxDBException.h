@@ -6,12 +6,10 @@
 #include <string>
 #include <vector>
 
-#include "platform/core/OxExport.h"
-
 // The exception of the ODBC classes: the return code of the failed call and the
 // diagnostic records of its handle (SQLGetDiagRec), or a text of our own for failures that
 // no driver reported (a closed recordset, a move past the end).
-class OX_EXPORT OxDBException : public std::exception {
+class OxDBException : public std::exception {
 public:
     struct Record {
         std::wstring state;  // five characters, empty for our own failures

@@ -7,12 +7,10 @@
 #include <string>
 #include <vector>
 
-#include "platform/core/OxExport.h"
-
 // A value read from an ODBC column: its kind and the value. Text is decoded (the kinds
 // string, 8-bit string and wide string all hold it in m_str as wide text); binary data
 // keeps its bytes. clear() keeps the buffers, so one variant serves many rows cheaply.
-class OX_EXPORT OxDBVariant {
+class OxDBVariant {
 public:
     enum Kind : uint8_t {
         DBVT_NULL,

@@ -7,7 +7,6 @@
 #include <string>
 #include <vector>
 
-#include "platform/core/OxExport.h"
 #include "platform/odbc/OxOdbcHandle.h"
 
 class OxOdbcEnvironment;
@@ -19,7 +18,7 @@ class OxOdbcStatement;
 //
 // Text crosses the ODBC interface as UTF-8 through the ANSI calls: the driver manager's
 // conversion of wide calls for drivers without wide entry points garbles non-ASCII text.
-class OX_EXPORT OxOdbcDatabase {
+class OxOdbcDatabase {
 public:
     explicit OxOdbcDatabase(std::shared_ptr<OxOdbcEnvironment> environment = nullptr);
     virtual ~OxOdbcDatabase();

@@ -7,12 +7,11 @@
 #include <utility>
 #include <vector>
 
-#include "platform/core/OxExport.h"
 #include "platform/odbc/OxOdbcHandle.h"
 
 // An ODBC 3 environment. Connections hold it by shared pointer, so that several may share
 // one and it outlives them all.
-class OX_EXPORT OxOdbcEnvironment {
+class OxOdbcEnvironment {
 public:
     struct DataSource {
         std::wstring name;

@@ -2,10 +2,8 @@
 
 #include <sql.h>
 
-#include "platform/core/OxExport.h"
-
 // One ODBC handle (environment, connection, statement or descriptor), freed with its owner.
-class OX_EXPORT OxOdbcHandle {
+class OxOdbcHandle {
 public:
     OxOdbcHandle() = default;
     // Allocates a handle of the type under the parent (SQL_NULL_HANDLE for an environment);

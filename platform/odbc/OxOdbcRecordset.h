@@ -6,7 +6,6 @@
 #include <string>
 #include <vector>
 
-#include "platform/core/OxExport.h"
 #include "platform/odbc/OxDBVariant.h"
 #include "platform/odbc/OxOdbcFieldInfo.h"
 #include "platform/odbc/OxOdbcStatement.h"
@@ -17,7 +16,7 @@ class OxOdbcDatabase;
 // cursor allows, read column by column. Each column of the current row is read from the
 // driver once and kept, so reading it again, as another kind or out of order is safe on
 // drivers that allow one read per column. Failures throw OxDBException.
-class OX_EXPORT OxOdbcRecordset {
+class OxOdbcRecordset {
 public:
     enum OpenType { dynaset = 0, snapshot = 1, dynamic = 2, forwardOnly = 3 };
     enum OpenOptions : unsigned { none = 0, readOnly = 4 };

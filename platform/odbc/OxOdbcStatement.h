@@ -7,7 +7,6 @@
 #include <string>
 #include <string_view>
 
-#include "platform/core/OxExport.h"
 #include "platform/odbc/OxOdbcFieldInfo.h"
 #include "platform/odbc/OxOdbcHandle.h"
 
@@ -19,7 +18,7 @@ class OxVariant;
 // description, scrolling fetches and typed column reads. The handle is allocated on first
 // use (with the database's query time-out) and freed by free(), by the database's close, or
 // with the object. Every failure throws OxDBException.
-class OX_EXPORT OxOdbcStatement {
+class OxOdbcStatement {
 public:
     explicit OxOdbcStatement(OxOdbcDatabase* database = nullptr);
     ~OxOdbcStatement();
