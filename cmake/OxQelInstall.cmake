@@ -8,10 +8,17 @@ install(TARGETS OxPlatformCore OxClassesDll OxQelDll
   INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/oxqel)
 
 # Public headers keep the source layout, so installed and in-tree includes read the same.
+# A part keeps a header out of the package (one that names engine or platform types) with
+#   set_property(GLOBAL APPEND PROPERTY OXQEL_PRIVATE_HEADERS ${CMAKE_CURRENT_SOURCE_DIR}/X.h)
+get_property(private_headers GLOBAL PROPERTY OXQEL_PRIVATE_HEADERS)
 foreach(dir platform/core OxClasses OxQelLib)
-  install(DIRECTORY ${PROJECT_SOURCE_DIR}/${dir}/
-    DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/oxqel/${dir}
-    FILES_MATCHING PATTERN "*.h")
+  file(GLOB_RECURSE headers RELATIVE ${PROJECT_SOURCE_DIR} ${PROJECT_SOURCE_DIR}/${dir}/*.h)
+  foreach(header ${headers})
+    if(NOT ${PROJECT_SOURCE_DIR}/${header} IN_LIST private_headers)
+      get_filename_component(subdir ${header} DIRECTORY)
+      install(FILES ${PROJECT_SOURCE_DIR}/${header} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/oxqel/${subdir})
+    endif()
+  endforeach()
 endforeach()
 
 install(EXPORT OxQelTargets NAMESPACE OxQel:: DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/OxQel)
