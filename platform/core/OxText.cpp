@@ -98,9 +98,8 @@ std::wstring fromUtf8(std::string_view text) {
     return out;
 }
 
-std::u16string toUtf16(std::wstring_view text) {
-    std::u16string out;
-    out.reserve(text.size());
+void appendUtf16(std::u16string& out, std::wstring_view text) {
+    out.reserve(out.size() + text.size());
     for (wchar_t wc : text) {
         auto c = static_cast<char32_t>(wc);
         if (!isScalar(c))
@@ -113,12 +112,16 @@ std::u16string toUtf16(std::wstring_view text) {
             out.push_back(static_cast<char16_t>(0xDC00 + (c & 0x3FF)));
         }
     }
+}
+
+std::u16string toUtf16(std::wstring_view text) {
+    std::u16string out;
+    appendUtf16(out, text);
     return out;
 }
 
-std::wstring fromUtf16(std::u16string_view text) {
-    std::wstring out;
-    out.reserve(text.size());
+void appendFromUtf16(std::wstring& out, std::u16string_view text) {
+    out.reserve(out.size() + text.size());
     for (size_t i = 0; i < text.size(); ++i) {
         char32_t c = text[i];
         if (c >= 0xD800 && c <= 0xDBFF && i + 1 < text.size() && text[i + 1] >= 0xDC00 &&
@@ -130,6 +133,11 @@ std::wstring fromUtf16(std::u16string_view text) {
         }
         out.push_back(static_cast<wchar_t>(c));
     }
+}
+
+std::wstring fromUtf16(std::u16string_view text) {
+    std::wstring out;
+    appendFromUtf16(out, text);
     return out;
 }
 

@@ -16,6 +16,8 @@ OX_EXPORT void appendFromUtf8(std::wstring& out, std::string_view text);
 
 OX_EXPORT std::u16string toUtf16(std::wstring_view text);
 OX_EXPORT std::wstring fromUtf16(std::u16string_view text);
+OX_EXPORT void appendUtf16(std::u16string& out, std::wstring_view text);
+OX_EXPORT void appendFromUtf16(std::wstring& out, std::u16string_view text);
 
 OX_EXPORT wchar_t toUpper(wchar_t c);
 OX_EXPORT wchar_t toLower(wchar_t c);
