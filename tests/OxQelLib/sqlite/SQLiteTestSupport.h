@@ -30,6 +30,8 @@ class RawDb {
 public:
     explicit RawDb(const std::filesystem::path& path);
     ~RawDb();
+    RawDb(const RawDb&) = delete;
+    RawDb& operator=(const RawDb&) = delete;
     sqlite3* get() const { return m_db; }
     void exec(const std::string& sql);
     // The first column of the first row as text ("NULL" for NULL, "" without a row).
