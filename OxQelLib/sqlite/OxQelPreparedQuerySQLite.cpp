@@ -54,6 +54,7 @@ bool OxQelPreparedQuerySQLite::prepareQuery(const std::wstring& statement) {
         }
         m_notPrepared = 0;
         m_compiledOn = db;
+        m_parameterCount = getNumberOfParamInPreparedStatement();
         m_utf16 = m_connection->isUtf16();
         const size_t count =
             static_cast<size_t>(std::max(0, getNumberOfParamInPreparedStatement()));
@@ -73,7 +74,7 @@ int OxQelPreparedQuerySQLite::getNumberOfParamInPreparedStatement() const {
 }
 
 bool OxQelPreparedQuerySQLite::verifyBindIndex(int index) const {
-    return index >= 1 && index <= getNumberOfParamInPreparedStatement();
+    return index >= 1 && index <= m_parameterCount;
 }
 
 std::wstring OxQelPreparedQuerySQLite::convertDateToString(const OxDateTime& date) const {
@@ -100,15 +101,13 @@ bool OxQelPreparedQuerySQLite::bindText(int index, std::wstring_view text) {
     // In the database's own encoding the engine stores the text without converting it.
     if (m_utf16) {
         std::u16string& units = m_units[slot];
-        units.clear();
-        OxText::appendUtf16(units, text);
-        rc = sqlite3_bind_text16(m_statement, index, units.c_str(),
-                                 static_cast<int>(units.size() * 2), SQLITE_STATIC);
+        const size_t length = oxSQLiteEncode(text, units);
+        rc = sqlite3_bind_text16(m_statement, index, units.data(), static_cast<int>(length * 2),
+                                 SQLITE_STATIC);
     } else {
         std::string& bytes = m_bytes[slot];
-        bytes.clear();
-        OxText::appendUtf8(bytes, text);
-        rc = sqlite3_bind_text(m_statement, index, bytes.c_str(), static_cast<int>(bytes.size()),
+        const size_t length = oxSQLiteEncode(text, bytes);
+        rc = sqlite3_bind_text(m_statement, index, bytes.data(), static_cast<int>(length),
                                SQLITE_STATIC);
     }
     return checkBind(rc, L"index: %d val: %s", index, text);
@@ -136,6 +135,10 @@ bool OxQelPreparedQuerySQLite::bindParameter(int index, const std::wstring& valu
 }
 
 bool OxQelPreparedQuerySQLite::bindParameter(int index, long value) {
+    return bindInteger(index, value);
+}
+
+bool OxQelPreparedQuerySQLite::bindInteger(int index, long value) {
     if (!isValid() || !verifyBindIndex(index))
         return false;
     return checkBind(sqlite3_bind_int64(m_statement, index, value), L"index: %d val: %d", index,
@@ -143,6 +146,10 @@ bool OxQelPreparedQuerySQLite::bindParameter(int index, long value) {
 }
 
 bool OxQelPreparedQuerySQLite::bindParameter(int index, double value) {
+    return bindReal(index, value);
+}
+
+bool OxQelPreparedQuerySQLite::bindReal(int index, double value) {
     if (!isValid() || !verifyBindIndex(index))
         return false;
     return checkBind(sqlite3_bind_double(m_statement, index, value), L"index: %d val: %f", index,
@@ -162,10 +169,10 @@ bool OxQelPreparedQuerySQLite::bindByOwnType(int index, const OxVariant& value) 
     if (oxSQLiteIsInteger(value.vt())) {
         long v = 0;
         OxQel::_variantToLong(value, v);
-        return bindParameter(index, v);
+        return bindInteger(index, v);
     }
     if (oxSQLiteIsReal(value.vt()))
-        return bindParameter(index, value.vt() == VT_R4 ? double(value.fltVal()) : value.dblVal());
+        return bindReal(index, value.vt() == VT_R4 ? double(value.fltVal()) : value.dblVal());
     switch (value.vt()) {
         case VT_EMPTY:
         case VT_NULL:
@@ -204,12 +211,12 @@ bool OxQelPreparedQuerySQLite::bindParameterVariant(int index, const OxVariant& 
             case OxQel::Integer: {
                 long v = 0;
                 OxQel::_variantToLong(value, v);
-                return bindParameter(index, v);
+                return bindInteger(index, v);
             }
             case OxQel::Double: {
                 double v = 0;
                 OxQel::_variantToDouble(value, v);
-                return bindParameter(index, v);
+                return bindReal(index, v);
             }
             case OxQel::Date: {
                 OxDateTime v;
@@ -259,6 +266,7 @@ bool OxQelPreparedQuerySQLite::deletePreparedQuery() {
         rc = sqlite3_finalize(m_statement);
     m_statement = nullptr;
     m_notPrepared = 1;
+    m_parameterCount = -1;
     if (rc != SQLITE_OK) {
         OXQEL_REPORT(OxQelSQLiteStatement::message(rc),
                      L"OxQelPreparedQuerySQLite::deletePreparedQuery",

@@ -45,6 +45,8 @@ private:
     bool verifyBindIndex(int index) const;
     std::wstring convertDateToString(const OxDateTime& date) const;
     bool bindText(int index, std::wstring_view text);
+    bool bindInteger(int index, long value);
+    bool bindReal(int index, double value);
     bool bindBytes(int index, const void* data, size_t size);
     bool bindNull(int index);
     bool bindByOwnType(int index, const OxVariant& value);
@@ -54,6 +56,7 @@ private:
     OxQelConnectionSQLite* m_connection = nullptr;
     sqlite3_stmt* m_statement = nullptr;
     int m_notPrepared = 1;
+    int m_parameterCount = -1;
     // The engine handle the statement was compiled on: a reopened connection has another.
     sqlite3* m_compiledOn = nullptr;
     bool m_utf16 = false;

@@ -172,3 +172,56 @@ bool oxSQLiteIsInteger(uint16_t vt) {
 bool oxSQLiteIsReal(uint16_t vt) {
     return vt == 4 || vt == 5;  // VT_R4, VT_R8
 }
+
+namespace {
+uint32_t scalar(wchar_t wc) {
+    const auto c = static_cast<uint32_t>(wc);
+    return (c >= 0xD800 && c <= 0xDFFF) || c > 0x10FFFF ? 0xFFFD : c;
+}
+}  // namespace
+
+size_t oxSQLiteEncode(std::wstring_view text, std::string& utf8) {
+    if (utf8.size() < text.size() * 4)
+        utf8.resize(text.size() * 4);
+    char* o = utf8.data();
+    const wchar_t* p = text.data();
+    const wchar_t* const end = p + text.size();
+    // Plain branches measured fastest on texts of one script; a branch-free form was
+    // slower on every mix tried.
+    while (p < end) {
+        const uint32_t c = scalar(*p++);
+        if (c < 0x80) {
+            *o++ = static_cast<char>(c);
+        } else if (c < 0x800) {
+            *o++ = static_cast<char>(0xC0 | (c >> 6));
+            *o++ = static_cast<char>(0x80 | (c & 0x3F));
+        } else if (c < 0x10000) {
+            *o++ = static_cast<char>(0xE0 | (c >> 12));
+            *o++ = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
+            *o++ = static_cast<char>(0x80 | (c & 0x3F));
+        } else {
+            *o++ = static_cast<char>(0xF0 | (c >> 18));
+            *o++ = static_cast<char>(0x80 | ((c >> 12) & 0x3F));
+            *o++ = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
+            *o++ = static_cast<char>(0x80 | (c & 0x3F));
+        }
+    }
+    return static_cast<size_t>(o - utf8.data());
+}
+
+size_t oxSQLiteEncode(std::wstring_view text, std::u16string& utf16) {
+    if (utf16.size() < text.size() * 2)
+        utf16.resize(text.size() * 2);
+    char16_t* o = utf16.data();
+    for (wchar_t wc : text) {
+        uint32_t c = scalar(wc);
+        if (c < 0x10000) {
+            *o++ = static_cast<char16_t>(c);
+        } else {
+            c -= 0x10000;
+            *o++ = static_cast<char16_t>(0xD800 + (c >> 10));
+            *o++ = static_cast<char16_t>(0xDC00 + (c & 0x3FF));
+        }
+    }
+    return static_cast<size_t>(o - utf16.data());
+}

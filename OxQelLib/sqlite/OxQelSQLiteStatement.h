@@ -50,6 +50,12 @@ private:
 // Identifiers in double quotes, with quotes inside doubled: safe for any name.
 std::wstring oxSQLiteQuoteIdentifier(std::wstring_view name);
 
+// Wide text in the engine's encodings, written into a buffer that only grows, so that a
+// text bound row after row costs no allocation: the length used, in code units. Text
+// that is no Unicode scalar becomes U+FFFD, as everywhere in the library.
+size_t oxSQLiteEncode(std::wstring_view text, std::string& utf8);
+size_t oxSQLiteEncode(std::wstring_view text, std::u16string& utf16);
+
 // Integer and real variant types, which the engine stores as they are.
 bool oxSQLiteIsInteger(uint16_t vt);
 bool oxSQLiteIsReal(uint16_t vt);

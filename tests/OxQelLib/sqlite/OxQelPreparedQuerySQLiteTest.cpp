@@ -188,3 +188,24 @@ TEST(SQLitePreparedQuery, LifecycleAndFailures) {
     EXPECT_TRUE(q.executePreparedQuery());
     EXPECT_EQ(db.raw().scalar("SELECT group_concat(b) FROM u"), "5,6");
 }
+
+TEST(SQLitePreparedQuery, TextsArriveWholeInEitherEncoding) {
+    Database utf8("CREATE TABLE t(v);");
+    Database utf16;
+    ASSERT_TRUE(utf16.connection().execute(L"CREATE TABLE t(v)"));
+    for (Database* db : {&utf8, &utf16}) {
+        auto q = prepared(db->connection(), L"INSERT INTO t VALUES (]]]1[[[)");
+        // Every length of UTF-8 sequence, an embedded zero, and a lone surrogate.
+        std::wstring text = L"a\u00e9\u4e2d\U0001F600";
+        text.push_back(L'\0');
+        text += L"z";
+        text.push_back(static_cast<wchar_t>(0xD800));
+        ASSERT_TRUE(q->bindParameter(1, text));
+        ASSERT_TRUE(q->executePreparedQuery());
+        ASSERT_TRUE(q->bindParameter(1, std::wstring(300, L'\u00fc')));
+        ASSERT_TRUE(q->executePreparedQuery());
+        EXPECT_EQ(db->raw().rows("SELECT v = 'aé中😀' || char(0) || 'z' || char(65533), "
+                                 "v = printf('%.300c', 'ü') FROM t ORDER BY rowid"),
+                  (std::vector<std::string>{"1|0", "0|1"}));
+    }
+}
