@@ -3,7 +3,7 @@
 // through a temporary table, and ordering by the natural-sort key.
 //
 //   bench_sqlite [ROWS [ONLY]]  (default 1,000,000 rows, or OXQEL_BENCH_ROWS; ONLY picks
-//                                one of load, insert, in, sort)
+//                                one of load, insert, in, sort, calls)
 //
 // Each figure is the best of a few runs. Peak memory is measured in a child process of
 // its own, from the kernel's high-water mark of resident memory.
@@ -546,6 +546,62 @@ void benchNaturalSort(const fs::path& path, bool utf16, const char* tag) {
         report(std::string("  registered for UTF-16 only, time ") + tag, raw, utf16Only, 0, "ms",
                1e3);
 }
+// ---------------------------------------------------------------- engine entry points
+
+// Which of the engine's two text interfaces the library uses where both give the same
+// result: compiling statement texts (kept as wide strings) and reading column texts.
+void benchEntryPoints(const fs::path& path, bool utf16, const char* tag) {
+    std::wstring text = L"INSERT INTO t (s) VALUES ";
+    for (int i = 0; i < 500; ++i) text += (i ? L",('" : L"('") + std::to_wstring(i) + L" ü')";
+    sqlite3* db = openRaw(path, utf16);
+    auto compile = [&](bool wide) {
+        return timed([&] {
+            for (int i = 0; i < 300; ++i) {
+                sqlite3_stmt* stmt = nullptr;
+                if (wide) {
+                    const std::u16string sql = OxText::toUtf16(text);
+                    sqlite3_prepare16_v2(db, sql.c_str(), int(sql.size() * 2), &stmt, nullptr);
+                } else {
+                    const std::string sql = OxText::toUtf8(text);
+                    sqlite3_prepare_v2(db, sql.c_str(), int(sql.size()), &stmt, nullptr);
+                }
+                sqlite3_finalize(stmt);
+            }
+        });
+    };
+    auto readTexts = [&](bool wide) {
+        return timed([&] {
+            sqlite3_stmt* stmt = nullptr;
+            sqlite3_prepare_v2(db, "SELECT u FROM t LIMIT 300000", -1, &stmt, nullptr);
+            size_t bytes = 0;
+            while (sqlite3_step(stmt) == SQLITE_ROW) {
+                if (wide) {
+                    sqlite3_column_text16(stmt, 0);
+                    bytes += size_t(sqlite3_column_bytes16(stmt, 0));
+                } else {
+                    sqlite3_column_text(stmt, 0);
+                    bytes += size_t(sqlite3_column_bytes(stmt, 0));
+                }
+            }
+            sqlite3_finalize(stmt);
+            if (bytes == 0)
+                std::exit(9);
+        });
+    };
+    double compile8 = 1e99, compile16 = 1e99, read8 = 1e99, read16 = 1e99;
+    for (int run = 0; run < kRuns; ++run) {
+        compile8 = std::min(compile8, compile(false));
+        compile16 = std::min(compile16, compile(true));
+        read8 = std::min(read8, readTexts(false));
+        read16 = std::min(read16, readTexts(true));
+    }
+    sqlite3_close(db);
+    // Here the "raw" column is the UTF-8 call and the "library" column the UTF-16 one.
+    report(std::string("  compile: UTF-8 call vs UTF-16 call ") + tag, compile8, compile16, 0, "ms",
+           1e3);
+    report(std::string("  read texts: UTF-8 call vs UTF-16 call ") + tag, read8, read16, 0, "ms",
+           1e3);
+}
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -578,6 +634,8 @@ int main(int argc, char** argv) {
             benchExecuteIn(path, utf16, tag);
         if (wanted("sort"))
             benchNaturalSort(path, utf16, tag);
+        if (wanted("calls"))
+            benchEntryPoints(path, utf16, tag);
     }
     std::printf("%s\n", g_misses ? "some ratios are missed" : "every ratio is met");
     return g_misses ? 1 : 0;
