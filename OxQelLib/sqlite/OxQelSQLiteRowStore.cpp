@@ -4,6 +4,7 @@
 
 #include <cstring>
 
+#include "OxQelLib/sqlite/OxQelSQLiteStatement.h"
 #include "platform/core/OxText.h"
 
 namespace {
@@ -115,15 +116,15 @@ OxVariant OxQelSQLiteRowStore::value(size_t row, int column) const {
             return OxVariant(static_cast<long long>(c.i));
         case Kind::Real:
             return OxVariant(c.d);
-        case Kind::Text:
-            m_scratch.clear();
-            if (m_utf16)
-                OxText::appendFromUtf16(
-                    m_scratch, std::u16string_view(static_cast<const char16_t*>(c.p), c.size / 2));
-            else
-                OxText::appendFromUtf8(m_scratch,
-                                       std::string_view(static_cast<const char*>(c.p), c.size));
-            return OxVariant(std::wstring_view(m_scratch));
+        case Kind::Text: {
+            const size_t length =
+                m_utf16 ? oxSQLiteDecode(
+                              std::u16string_view(static_cast<const char16_t*>(c.p), c.size / 2),
+                              m_scratch)
+                        : oxSQLiteDecode(std::string_view(static_cast<const char*>(c.p), c.size),
+                                         m_scratch);
+            return OxVariant(std::wstring_view(m_scratch.data(), length));
+        }
         case Kind::Blob:
             return OxVariant::fromBytes(c.p, c.size);
         default:

@@ -225,3 +225,66 @@ size_t oxSQLiteEncode(std::wstring_view text, std::u16string& utf16) {
     }
     return static_cast<size_t>(o - utf16.data());
 }
+
+size_t oxSQLiteDecode(std::string_view utf8, std::wstring& out) {
+    if (out.size() < utf8.size())
+        out.resize(utf8.size());
+    wchar_t* o = out.data();
+    const auto* p = reinterpret_cast<const unsigned char*>(utf8.data());
+    const auto* const end = p + utf8.size();
+    while (p < end) {
+        const unsigned char b = *p;
+        if (b < 0x80) {
+            *o++ = static_cast<wchar_t>(b);
+            ++p;
+            continue;
+        }
+        int extra;
+        uint32_t c;
+        uint32_t min;
+        if ((b & 0xE0) == 0xC0) {
+            extra = 1, c = b & 0x1F, min = 0x80;
+        } else if ((b & 0xF0) == 0xE0) {
+            extra = 2, c = b & 0x0F, min = 0x800;
+        } else if ((b & 0xF8) == 0xF0) {
+            extra = 3, c = b & 0x07, min = 0x10000;
+        } else {
+            *o++ = static_cast<wchar_t>(0xFFFD);
+            ++p;
+            continue;
+        }
+        const unsigned char* q = p + 1;
+        int i = 0;
+        for (; i < extra && q < end && (*q & 0xC0) == 0x80; ++i, ++q) c = (c << 6) | (*q & 0x3F);
+        if (i < extra || c < min || scalar(static_cast<wchar_t>(c)) != c) {
+            // One replacement for the broken sequence; reading resumes where a character
+            // could start.
+            *o++ = static_cast<wchar_t>(0xFFFD);
+            p = i == 0 ? p + 1 : q;
+            continue;
+        }
+        *o++ = static_cast<wchar_t>(c);
+        p = q;
+    }
+    return static_cast<size_t>(o - out.data());
+}
+
+size_t oxSQLiteDecode(std::u16string_view utf16, std::wstring& out) {
+    if (out.size() < utf16.size())
+        out.resize(utf16.size());
+    wchar_t* o = out.data();
+    const size_t n = utf16.size();
+    for (size_t i = 0; i < n; ++i) {
+        uint32_t c = utf16[i];
+        if (c >= 0xD800 && c <= 0xDFFF) {
+            if (c <= 0xDBFF && i + 1 < n && utf16[i + 1] >= 0xDC00 && utf16[i + 1] <= 0xDFFF) {
+                c = 0x10000 + ((c - 0xD800) << 10) + (utf16[i + 1] - 0xDC00u);
+                ++i;
+            } else {
+                c = 0xFFFD;
+            }
+        }
+        *o++ = static_cast<wchar_t>(c);
+    }
+    return static_cast<size_t>(o - out.data());
+}

@@ -56,6 +56,11 @@ std::wstring oxSQLiteQuoteIdentifier(std::wstring_view name);
 size_t oxSQLiteEncode(std::wstring_view text, std::string& utf8);
 size_t oxSQLiteEncode(std::wstring_view text, std::u16string& utf16);
 
+// The engine's texts as wide text, into a buffer that only grows: the characters
+// written. Broken sequences become U+FFFD exactly as OxText reads them.
+size_t oxSQLiteDecode(std::string_view utf8, std::wstring& out);
+size_t oxSQLiteDecode(std::u16string_view utf16, std::wstring& out);
+
 // Integer and real variant types, which the engine stores as they are.
 bool oxSQLiteIsInteger(uint16_t vt);
 bool oxSQLiteIsReal(uint16_t vt);
