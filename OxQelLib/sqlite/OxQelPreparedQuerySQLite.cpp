@@ -100,13 +100,18 @@ bool OxQelPreparedQuerySQLite::bindText(int index, std::wstring_view text) {
     int rc;
     // In the database's own encoding the engine stores the text without converting it.
     if (m_utf16) {
+        // The buffers only grow: a text bound row after row costs no allocation.
         std::u16string& units = m_units[slot];
-        const size_t length = oxSQLiteEncode(text, units);
+        if (units.size() < text.size() * 2)
+            units.resize(text.size() * 2);
+        const size_t length = OxText::encodeUtf16(text, units.data());
         rc = sqlite3_bind_text16(m_statement, index, units.data(), static_cast<int>(length * 2),
                                  SQLITE_STATIC);
     } else {
         std::string& bytes = m_bytes[slot];
-        const size_t length = oxSQLiteEncode(text, bytes);
+        if (bytes.size() < text.size() * 4)
+            bytes.resize(text.size() * 4);
+        const size_t length = OxText::encodeUtf8(text, bytes.data());
         rc = sqlite3_bind_text(m_statement, index, bytes.data(), static_cast<int>(length),
                                SQLITE_STATIC);
     }

@@ -4,7 +4,6 @@
 
 #include <cstring>
 
-#include "OxQelLib/sqlite/OxQelSQLiteStatement.h"
 #include "platform/core/OxText.h"
 
 namespace {
@@ -117,12 +116,16 @@ OxVariant OxQelSQLiteRowStore::value(size_t row, int column) const {
         case Kind::Real:
             return OxVariant(c.d);
         case Kind::Text: {
+            // The scratch buffer only grows: reading a text allocates only its variant.
+            const size_t units = m_utf16 ? c.size / 2 : c.size;
+            if (m_scratch.size() < units)
+                m_scratch.resize(units);
             const size_t length =
-                m_utf16 ? oxSQLiteDecode(
-                              std::u16string_view(static_cast<const char16_t*>(c.p), c.size / 2),
-                              m_scratch)
-                        : oxSQLiteDecode(std::string_view(static_cast<const char*>(c.p), c.size),
-                                         m_scratch);
+                m_utf16 ? OxText::decodeUtf16(
+                              std::u16string_view(static_cast<const char16_t*>(c.p), units),
+                              m_scratch.data())
+                        : OxText::decodeUtf8(std::string_view(static_cast<const char*>(c.p), units),
+                                             m_scratch.data());
             return OxVariant(std::wstring_view(m_scratch.data(), length));
         }
         case Kind::Blob:

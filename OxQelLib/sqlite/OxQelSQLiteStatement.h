@@ -50,17 +50,6 @@ private:
 // Identifiers in double quotes, with quotes inside doubled: safe for any name.
 std::wstring oxSQLiteQuoteIdentifier(std::wstring_view name);
 
-// Wide text in the engine's encodings, written into a buffer that only grows, so that a
-// text bound row after row costs no allocation: the length used, in code units. Text
-// that is no Unicode scalar becomes U+FFFD, as everywhere in the library.
-size_t oxSQLiteEncode(std::wstring_view text, std::string& utf8);
-size_t oxSQLiteEncode(std::wstring_view text, std::u16string& utf16);
-
-// The engine's texts as wide text, into a buffer that only grows: the characters
-// written. Broken sequences become U+FFFD exactly as OxText reads them.
-size_t oxSQLiteDecode(std::string_view utf8, std::wstring& out);
-size_t oxSQLiteDecode(std::u16string_view utf16, std::wstring& out);
-
 // Integer and real variant types, which the engine stores as they are.
 bool oxSQLiteIsInteger(uint16_t vt);
 bool oxSQLiteIsReal(uint16_t vt);
