@@ -187,6 +187,9 @@ TEST(SQLiteConnectionFiles, CreateFindAndDropDatabaseFiles) {
     // A new file is a complete database in UTF-16, whatever opens it next.
     EXPECT_TRUE(OxQelConnectionSQLite::_isSQLiteFile(path));
     EXPECT_EQ(RawDb(dir.file("new [1].db")).scalar("PRAGMA encoding"), "UTF-16le");
+    EXPECT_EQ(RawDb(dir.file("new [1].db")).scalar("SELECT count(*) FROM sqlite_master"), "0");
+    OxTest::writeFile(dir.file("text.db"), std::string(5000, 'x'));
+    EXPECT_FALSE(c.createDatabase(dir.wfile("text.db"), L"", L"", L"")) << "no database file";
 
     // An existing database keeps its content and its header.
     RawDb(dir.file("new [1].db")).exec("CREATE TABLE t(a); PRAGMA user_version=7;");
