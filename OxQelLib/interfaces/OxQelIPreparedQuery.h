@@ -42,6 +42,8 @@ public:
     bool bindParameter(int index, const wchar_t* value) {
         return bindParameter(index, std::wstring(value ? value : L""));
     }
+    // 8-bit text would silently bind as the boolean true.
+    bool bindParameter(int index, const char* value) = delete;
 
 protected:
     OxQelIPreparedQuery() = default;

@@ -22,44 +22,42 @@ locale_t caseLocale() {
 }  // namespace
 
 namespace OxText {
-void appendUtf8(std::string& out, std::wstring_view text) {
-    out.reserve(out.size() + text.size());
+// The conversions write through a pointer into room made first: pushing one unit at a
+// time cost more than the conversion itself. Buffers that are reused keep their room, so
+// a conversion per row allocates nothing.
+size_t encodeUtf8(std::wstring_view text, char* out) {
+    char* o = out;
     for (wchar_t wc : text) {
         auto c = static_cast<char32_t>(wc);
         if (c < 0x80) {
-            out.push_back(static_cast<char>(c));
+            *o++ = static_cast<char>(c);
             continue;
         }
         if (!isScalar(c))
             c = kReplacement;
         if (c < 0x800) {
-            out.push_back(static_cast<char>(0xC0 | (c >> 6)));
+            *o++ = static_cast<char>(0xC0 | (c >> 6));
         } else if (c < 0x10000) {
-            out.push_back(static_cast<char>(0xE0 | (c >> 12)));
-            out.push_back(static_cast<char>(0x80 | ((c >> 6) & 0x3F)));
+            *o++ = static_cast<char>(0xE0 | (c >> 12));
+            *o++ = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
         } else {
-            out.push_back(static_cast<char>(0xF0 | (c >> 18)));
-            out.push_back(static_cast<char>(0x80 | ((c >> 12) & 0x3F)));
-            out.push_back(static_cast<char>(0x80 | ((c >> 6) & 0x3F)));
+            *o++ = static_cast<char>(0xF0 | (c >> 18));
+            *o++ = static_cast<char>(0x80 | ((c >> 12) & 0x3F));
+            *o++ = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
         }
-        out.push_back(static_cast<char>(0x80 | (c & 0x3F)));
+        *o++ = static_cast<char>(0x80 | (c & 0x3F));
     }
+    return static_cast<size_t>(o - out);
 }
 
-std::string toUtf8(std::wstring_view text) {
-    std::string out;
-    appendUtf8(out, text);
-    return out;
-}
-
-void appendFromUtf8(std::wstring& out, std::string_view text) {
+size_t decodeUtf8(std::string_view text, wchar_t* out) {
     const auto* p = reinterpret_cast<const unsigned char*>(text.data());
     const auto* end = p + text.size();
-    out.reserve(out.size() + text.size());
+    wchar_t* o = out;
     while (p < end) {
         unsigned char b = *p;
         if (b < 0x80) {
-            out.push_back(static_cast<wchar_t>(b));
+            *o++ = static_cast<wchar_t>(b);
             ++p;
             continue;
         }
@@ -73,7 +71,7 @@ void appendFromUtf8(std::wstring& out, std::string_view text) {
         } else if ((b & 0xF8) == 0xF0) {
             extra = 3, c = b & 0x07, min = 0x10000;
         } else {
-            out.push_back(static_cast<wchar_t>(kReplacement));
+            *o++ = static_cast<wchar_t>(kReplacement);
             ++p;
             continue;
         }
@@ -83,42 +81,35 @@ void appendFromUtf8(std::wstring& out, std::string_view text) {
         if (i < extra || c < min || !isScalar(c)) {
             // A broken sequence costs one replacement character and resumes at the next
             // byte that could start a character.
-            out.push_back(static_cast<wchar_t>(kReplacement));
+            *o++ = static_cast<wchar_t>(kReplacement);
             p = (i == 0) ? p + 1 : q;
             continue;
         }
-        out.push_back(static_cast<wchar_t>(c));
+        *o++ = static_cast<wchar_t>(c);
         p = q;
     }
+    return static_cast<size_t>(o - out);
 }
 
-std::wstring fromUtf8(std::string_view text) {
-    std::wstring out;
-    appendFromUtf8(out, text);
-    return out;
-}
-
-std::u16string toUtf16(std::wstring_view text) {
-    std::u16string out;
-    out.reserve(text.size());
+size_t encodeUtf16(std::wstring_view text, char16_t* out) {
+    char16_t* o = out;
     for (wchar_t wc : text) {
         auto c = static_cast<char32_t>(wc);
         if (!isScalar(c))
             c = kReplacement;
         if (c < 0x10000) {
-            out.push_back(static_cast<char16_t>(c));
+            *o++ = static_cast<char16_t>(c);
         } else {
             c -= 0x10000;
-            out.push_back(static_cast<char16_t>(0xD800 + (c >> 10)));
-            out.push_back(static_cast<char16_t>(0xDC00 + (c & 0x3FF)));
+            *o++ = static_cast<char16_t>(0xD800 + (c >> 10));
+            *o++ = static_cast<char16_t>(0xDC00 + (c & 0x3FF));
         }
     }
-    return out;
+    return static_cast<size_t>(o - out);
 }
 
-std::wstring fromUtf16(std::u16string_view text) {
-    std::wstring out;
-    out.reserve(text.size());
+size_t decodeUtf16(std::u16string_view text, wchar_t* out) {
+    wchar_t* o = out;
     for (size_t i = 0; i < text.size(); ++i) {
         char32_t c = text[i];
         if (c >= 0xD800 && c <= 0xDBFF && i + 1 < text.size() && text[i + 1] >= 0xDC00 &&
@@ -128,9 +119,68 @@ std::wstring fromUtf16(std::u16string_view text) {
         } else if (c >= 0xD800 && c <= 0xDFFF) {
             c = kReplacement;
         }
-        out.push_back(static_cast<wchar_t>(c));
+        *o++ = static_cast<wchar_t>(c);
     }
-    return out;
+    return static_cast<size_t>(o - out);
+}
+
+namespace {
+// Appends through one of the conversions above: room for the longest result, then the
+// string trimmed to what was written.
+template <class Out, class In, class Convert>
+void appendConverted(Out& out, In text, size_t unitsPerUnit, Convert convert) {
+    const size_t start = out.size();
+    out.resize(start + text.size() * unitsPerUnit);
+    out.resize(start + convert(text, out.data() + start));
+}
+
+// A string returned to keep gives back the room its conversion did not use.
+template <class S>
+S trimmed(S s) {
+    if (s.capacity() > 2 * s.size() + 64)
+        s.shrink_to_fit();
+    return s;
+}
+}  // namespace
+
+void appendUtf8(std::string& out, std::wstring_view text) {
+    appendConverted(out, text, 4, encodeUtf8);
+}
+
+std::string toUtf8(std::wstring_view text) {
+    std::string out;
+    appendUtf8(out, text);
+    return trimmed(std::move(out));
+}
+
+void appendFromUtf8(std::wstring& out, std::string_view text) {
+    appendConverted(out, text, 1, decodeUtf8);
+}
+
+std::wstring fromUtf8(std::string_view text) {
+    std::wstring out;
+    appendFromUtf8(out, text);
+    return trimmed(std::move(out));
+}
+
+void appendUtf16(std::u16string& out, std::wstring_view text) {
+    appendConverted(out, text, 2, encodeUtf16);
+}
+
+std::u16string toUtf16(std::wstring_view text) {
+    std::u16string out;
+    appendUtf16(out, text);
+    return trimmed(std::move(out));
+}
+
+void appendFromUtf16(std::wstring& out, std::u16string_view text) {
+    appendConverted(out, text, 1, decodeUtf16);
+}
+
+std::wstring fromUtf16(std::u16string_view text) {
+    std::wstring out;
+    appendFromUtf16(out, text);
+    return trimmed(std::move(out));
 }
 
 wchar_t toUpper(wchar_t c) {

@@ -16,6 +16,14 @@ OX_EXPORT void appendFromUtf8(std::wstring& out, std::string_view text);
 
 OX_EXPORT std::u16string toUtf16(std::wstring_view text);
 OX_EXPORT std::wstring fromUtf16(std::u16string_view text);
+OX_EXPORT void appendUtf16(std::u16string& out, std::wstring_view text);
+OX_EXPORT void appendFromUtf16(std::wstring& out, std::u16string_view text);
+// The same conversions into room the caller made: 4 bytes (UTF-8) or 2 units (UTF-16) per
+// character of text, or one character per unit of the source. The units written.
+OX_EXPORT size_t encodeUtf8(std::wstring_view text, char* out);
+OX_EXPORT size_t encodeUtf16(std::wstring_view text, char16_t* out);
+OX_EXPORT size_t decodeUtf8(std::string_view text, wchar_t* out);
+OX_EXPORT size_t decodeUtf16(std::u16string_view text, wchar_t* out);
 
 OX_EXPORT wchar_t toUpper(wchar_t c);
 OX_EXPORT wchar_t toLower(wchar_t c);

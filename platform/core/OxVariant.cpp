@@ -174,6 +174,12 @@ OxVariant OxVariant::fromInteger(int64_t value) noexcept {
     return OxVariant(static_cast<long long>(value));
 }
 
+OxVariant OxVariant::fromInt(int32_t value) noexcept {
+    OxVariant v(value);
+    v.m_vt = VT_INT;
+    return v;
+}
+
 float OxVariant::fltVal() const noexcept {
     float f;
     const uint32_t bits = static_cast<uint32_t>(m_lo);

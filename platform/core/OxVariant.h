@@ -92,6 +92,7 @@ public:
     }
     // The smallest of VT_I4 / VT_I8 that holds the value.
     static OxVariant fromInteger(int64_t value) noexcept;
+    static OxVariant fromInt(int32_t value) noexcept;  // VT_INT
 
     uint16_t vt() const noexcept { return m_vt; }
     bool isEmpty() const noexcept { return m_vt == VT_EMPTY; }
