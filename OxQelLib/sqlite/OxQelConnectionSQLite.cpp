@@ -4,6 +4,7 @@
 
 #include <glob.h>
 #include <sqlite3.h>
+#include <unistd.h>
 
 #include <filesystem>
 #include <map>
@@ -226,6 +227,61 @@ bool OxQelConnectionSQLite::openHandle(const std::wstring& database, const wchar
     if (encoding.prepare(m_handle, std::string_view("PRAGMA encoding")) == SQLITE_OK &&
         encoding.step() == SQLITE_ROW)
         m_utf16 = encoding.columnText(0).rfind(L"UTF-16", 0) == 0;
+    return true;
+}
+
+bool OxQelConnectionSQLite::backupDatabaseTo(const std::wstring& path) {
+    const wchar_t* function = L"OxQelConnectionSQLite::backupDatabaseTo";
+    if (!m_isOpen || !m_handle || path.empty())
+        return false;
+    const std::string target = OxText::toUtf8(path);
+    std::string temporary = target + ".oxtmp-XXXXXX";
+    const int fd = ::mkstemp(temporary.data());
+    if (fd < 0) {
+        OXQEL_REPORT(L"cannot create a file beside the destination", function, path);
+        return false;
+    }
+    ::close(fd);  // the engine takes an empty file as a new database
+    sqlite3* copy = nullptr;
+    int rc = sqlite3_open_v2(temporary.c_str(), &copy, SQLITE_OPEN_READWRITE, nullptr);
+    if (rc == SQLITE_OK) {
+        sqlite3_backup* backup = sqlite3_backup_init(copy, "main", m_handle, "main");
+        if (!backup) {
+            rc = sqlite3_errcode(copy);
+        } else {
+            // A writer elsewhere may hold the source for a while: wait as every other
+            // statement of the connection does.
+            int tries = 0;
+            do {
+                rc = sqlite3_backup_step(backup, -1);
+                if (rc == SQLITE_BUSY || rc == SQLITE_LOCKED)
+                    sqlite3_sleep(_miMaxRetryTimeout);
+            } while ((rc == SQLITE_BUSY || rc == SQLITE_LOCKED || rc == SQLITE_OK) &&
+                     ++tries < _miMaxRetryCount);
+            const int finished = sqlite3_backup_finish(backup);
+            if (rc == SQLITE_DONE)
+                rc = finished;
+        }
+    }
+    if (rc == SQLITE_OK || rc == SQLITE_DONE)
+        rc = sqlite3_exec(copy, "PRAGMA journal_mode=DELETE", nullptr, nullptr, nullptr);
+    const std::wstring failure =
+        rc == SQLITE_OK ? std::wstring() : OxQelSQLiteStatement::message(rc);
+    if (sqlite3_close(copy) != SQLITE_OK && rc == SQLITE_OK)
+        rc = SQLITE_ERROR;
+    if (rc != SQLITE_OK) {
+        OXQEL_REPORT(failure.empty() ? L"the copy could not be completed" : failure, function,
+                     path);
+        ::unlink(temporary.c_str());
+        return false;
+    }
+    // Journals of the database that is replaced would be applied to the copy.
+    for (const char* suffix : {"-wal", "-shm", "-journal"}) ::unlink((target + suffix).c_str());
+    if (::rename(temporary.c_str(), target.c_str()) != 0) {
+        OXQEL_REPORT(L"cannot replace the destination file", function, path);
+        ::unlink(temporary.c_str());
+        return false;
+    }
     return true;
 }
 

@@ -117,6 +117,11 @@ public:
     sqlite3* getHandle() const { return m_handle; }
     bool isUtf16() const { return m_utf16; }
 
+    // Writes a consistent copy of the open database (committed pages in a write-ahead
+    // log included) to path, through a temporary file beside it that replaces path only
+    // when complete; the stale journal files of an earlier database there are removed.
+    bool backupDatabaseTo(const std::wstring& path);
+
     static bool _isSQLiteFile(const std::wstring& path);
     static std::wstring _convertSQLiteErrorEnumToStringMessage(int code);
 

@@ -5,6 +5,7 @@
 #include <memory>
 
 #include "OxClasses/OxPath.h"
+#include "OxQelLib/sqlite/OxQelConnectionSQLite.h"
 #include "OxQelLib/transfer/OxQelImportExportTable.h"
 #include "OxQelLib/transfer/OxQelWorkerPool.h"
 
@@ -76,8 +77,11 @@ SQLError OxQelImportExportDatabase::copyDatabaseAsFile() {
     if (sourcePath == destinationPath || OxPath::isSameFile(sourcePath, destinationPath))
         return OxQel::ErrorUnknown;
     m_destination.closeDatabase();
-    if (OxPath::pathFileExists(destinationPath))
-        OxPath::deleteFile(destinationPath);
+    // A SQLite source may hold committed data outside its main file, or change while it is
+    // read: the engine's own backup gives a complete, consistent copy. Either way the
+    // destination is replaced only by a finished copy.
+    if (auto* sqlite = OxQelConnectionSQLite::cast(&m_source))
+        return sqlite->backupDatabaseTo(destinationPath) ? OxQel::NoError : OxQel::ErrorUnknown;
     return OxPath::copyFile(sourcePath, destinationPath, 0) ? OxQel::NoError : OxQel::ErrorUnknown;
 }
 
