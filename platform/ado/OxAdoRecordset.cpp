@@ -894,6 +894,7 @@ void OxAdoRecordset::remove(int affect) {
             OxAdo::raise(OxAdo::adErrInvalidConnection);
         OxAdoRowWriter writer(*m_connection, m_columns, m_keyCache, OxAdoRowWriter::CriteriaKey);
         writer.remove(r->original.empty() ? r->values : r->original);
+        r->status |= OxAdo::adRecDBDeleted;
     }
     r->status |= OxAdo::adRecDeleted;
     m_currentDeleted = true;

@@ -148,7 +148,6 @@ private:
     std::wstring m_source;
     std::wstring m_commandText;  // what was run: the source, or the SELECT of a table
     std::vector<OxAdoParamValue> m_parameters;
-    long m_commandOptions = OxAdo::adCmdText;
     bool m_open = false;
 
     std::vector<OxAdoColumnInfo> m_columns;

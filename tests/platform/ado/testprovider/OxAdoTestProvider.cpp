@@ -106,8 +106,8 @@ public:
     std::wstring providerName() const override { return kProvider; }
 
     void open(const OpenArgs& args) override {
-        hit(L"open", L"open");
         m_script->opens.push_back(args);
+        hit(L"open", L"open");
         ++m_script->openSessions;
         m_open = true;
     }
@@ -180,7 +180,8 @@ public:
                     std::to_wstring(c.definedSize);
             for (const auto& [name, value] : c.properties) {
                 OxVariant text;
-                if (!value.isEmpty() && !OxHr::failed(value.tryChangeType(VT_BSTR, text)))
+                if (!value.isEmpty() && !OxHr::failed(value.tryChangeType(VT_BSTR, text)) &&
+                    !text.bstr().empty())
                     call += L"[" + name + L"=" + text.str() + L"]";
             }
         }
