@@ -1,0 +1,3 @@
+#include "OxQelLib/odbc/OxDatabase.h"
+
+OxDatabase::~OxDatabase() = default;
