@@ -7,6 +7,28 @@ bool isBlank(wchar_t c) {
     return c == L' ' || c == L'\t' || c == L'\r' || c == L'\n';
 }
 
+std::wstring trimBlanks(const std::wstring& s) {
+    size_t b = 0, e = s.size();
+    while (b < e && isBlank(s[b])) ++b;
+    while (e > b && isBlank(s[e - 1])) --e;
+    return s.substr(b, e - b);
+}
+
+// Where a braced value that starts at pos ends: after its "}" ("}}" stands for one), or
+// npos when it never closes.
+size_t braceEnd(const std::wstring& text, size_t pos) {
+    for (size_t i = pos + 1; i < text.size(); ++i) {
+        if (text[i] != L'}')
+            continue;
+        if (i + 1 < text.size() && text[i + 1] == L'}') {
+            ++i;
+            continue;
+        }
+        return i + 1;
+    }
+    return std::wstring::npos;
+}
+
 // Reads a value from pos up to its ";" (or the end); quotes are removed, braces kept.
 std::wstring readValue(const std::wstring& text, size_t& pos) {
     while (pos < text.size() && isBlank(text[pos])) ++pos;
@@ -31,35 +53,31 @@ std::wstring readValue(const std::wstring& text, size_t& pos) {
     }
     if (pos < text.size() && text[pos] == L'{') {
         const size_t start = pos;
-        ++pos;
-        while (pos < text.size()) {
-            if (text[pos] == L'}') {
-                if (pos + 1 < text.size() && text[pos + 1] == L'}') {
-                    pos += 2;
-                    continue;
-                }
-                ++pos;
-                break;
-            }
-            ++pos;
-        }
-        value = text.substr(start, pos - start);
-        while (pos < text.size() && text[pos] != L';') value += text[pos++];
-        return OxText::trim(value);
+        const size_t end = braceEnd(text, pos);
+        pos = end == std::wstring::npos ? text.size() : end;
+        while (pos < text.size() && text[pos] != L';') ++pos;
+        return trimBlanks(text.substr(start, pos - start));
     }
     const size_t start = pos;
     while (pos < text.size() && text[pos] != L';') ++pos;
-    return OxText::trim(text.substr(start, pos - start));
+    return trimBlanks(text.substr(start, pos - start));
 }
 
+// Whether a value must be quoted to read back as itself.
 bool needsQuotes(const std::wstring& value) {
     if (value.empty())
         return false;
-    if (value.front() == L'{' && value.back() == L'}')
-        return false;
-    return value.find_first_of(L";'\"") != std::wstring::npos || isBlank(value.front()) ||
-           isBlank(value.back());
+    if (isBlank(value.front()) || isBlank(value.back()) || value.front() == L'"' ||
+        value.front() == L'\'')
+        return true;
+    if (value.front() == L'{') {
+        // A braced value reads whole when its brace closes and no ";" follows the close.
+        const size_t end = braceEnd(value, 0);
+        return end == std::wstring::npos || value.find(L';', end) != std::wstring::npos;
+    }
+    return value.find(L';') != std::wstring::npos;
 }
+
 }  // namespace
 
 OxAdoConnectionString::OxAdoConnectionString(const std::wstring& text) {
@@ -74,7 +92,7 @@ OxAdoConnectionString::OxAdoConnectionString(const std::wstring& text) {
             pos = semi + 1;
             continue;
         }
-        std::wstring key = OxText::trim(text.substr(pos, eq - pos));
+        std::wstring key = trimBlanks(text.substr(pos, eq - pos));
         pos = eq + 1;
         std::wstring value = readValue(text, pos);
         if (pos < text.size())
