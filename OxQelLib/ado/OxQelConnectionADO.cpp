@@ -9,6 +9,7 @@
 #include "OxQelLib/foundation/OxQelLog.h"
 #include "OxQelLib/foundation/OxQelQueryText.h"
 #include "platform/ado/OxAdoConnection.h"
+#include "platform/ado/OxAdoDefs.h"
 #include "platform/ado/OxAdoError.h"
 #include "platform/ado/OxAdoRecordset.h"
 #include "platform/ado/OxAdoxCatalog.h"
@@ -147,7 +148,7 @@ std::wstring OxQelConnectionADO::currentErrorMessage(OxQelIConnection* connectio
         // The provider's errors describe this failure only when it came from the provider.
         auto* ado = OxQelConnectionADO::cast(connection);
         if (ado && ado->m_connection && ado->m_connection->errors().count() > 0 &&
-            ado->m_connection->errors().item(0L)->number() == e.Error())
+            OxAdo::asHResult(ado->m_connection->errors().item(0L)->number()) == e.Error())
             ado->getProviderError(message);
         if (message.empty())
             getComError(message, e);

@@ -269,6 +269,12 @@ constexpr OxHResult hresultOf(ErrorValue error) {
     return static_cast<OxHResult>(0x800A0000u | static_cast<uint32_t>(error));
 }
 
+// Error numbers of the model's own values stand in the Errors collection as the plain
+// value (3719); raised, they carry their HRESULT form. Other numbers stay.
+constexpr OxHResult asHResult(OxHResult number) {
+    return number > 0 && number < 0x10000 ? hresultOf(static_cast<ErrorValue>(number)) : number;
+}
+
 // The command type carried in the options of Execute and Open: adCmdText when they name
 // none (adOptionUnspecified, or execute options alone).
 OX_EXPORT long commandTypeOf(long options);

@@ -15,7 +15,7 @@ OxAdoProviderError::OxAdoProviderError(std::vector<OxAdoErrorInfo> records)
 }
 
 OxHResult OxAdoProviderError::hresult() const noexcept {
-    return m_records.front().number;
+    return OxAdo::asHResult(m_records.front().number);
 }
 
 std::wstring OxAdoProviderError::description() const {

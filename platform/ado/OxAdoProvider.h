@@ -199,8 +199,8 @@ public:
 
     // The identifier as the source's SQL writes it.
     virtual std::wstring quoteIdentifier(const std::wstring& name) const;
-    // The value the source gave the auto-increment column of the row just inserted;
-    // empty when it cannot tell.
+    // The value the source generated for a column of the row just inserted (its automatic
+    // number); empty when it generated none or cannot tell. Never a value of another row.
     virtual OxVariant lastInsertedValue(const std::wstring& tableName,
                                         const std::wstring& columnName);
 

@@ -1,5 +1,7 @@
 #include "platform/ado/OxAdoRowWriter.h"
 
+#include <algorithm>
+
 #include "platform/ado/OxAdoConnection.h"
 #include "platform/core/OxText.h"
 
@@ -215,10 +217,16 @@ void OxAdoRowWriter::insert(std::vector<OxVariant>& values, const std::vector<bo
     }
     s.text += names.empty() ? L" DEFAULT VALUES" : L" (" + names + L") VALUES (" + marks + L")";
     run(s);
-    // The values the source generated for the new row.
+    // The values the source generated for the new row: its automatic numbers, and key
+    // columns left unset (a row-id key), so that the row can be found again.
+    const std::vector<int> key = keyColumns(table, true);
     for (size_t i = 0; i < m_columns.size(); ++i) {
         const OxAdoColumnInfo& c = m_columns[i];
-        if (!c.autoIncrement || c.baseTable.empty() || tableKey(static_cast<int>(i)) != table)
+        if (c.baseTable.empty() || tableKey(static_cast<int>(i)) != table)
+            continue;
+        const bool unsetKey = std::find(key.begin(), key.end(), static_cast<int>(i)) != key.end() &&
+                              (i >= set.size() || !set[i]);
+        if (!c.autoIncrement && !unsetKey)
             continue;
         OxVariant v = m_connection.call(
             [&] { return m_connection.session().lastInsertedValue(c.baseTable, c.baseColumn); });
