@@ -185,6 +185,22 @@ TEST_F(ConnectionADOTest, OpenFailureReportMasksThePassword) {
     EXPECT_EQ(script->opens.front().connectionTimeout, OxQel::_lConnectionTimeout);
 }
 
+TEST_F(ConnectionADOTest, TheLibrarysTimeoutsReachTheConnection) {
+    const int32_t connection = OxQel::_lConnectionTimeout;
+    const int32_t command = OxQel::_lCommandTimeout;
+    OxQel::_lConnectionTimeout = 11;
+    OxQel::_lCommandTimeout = 7;
+    TestConnectionADO other;
+    const bool opened = other.openConnection(L"", OxAdoTest::kConnectionString, L"", L"");
+    OxQel::_lConnectionTimeout = connection;
+    OxQel::_lCommandTimeout = command;
+    ASSERT_TRUE(opened);
+    EXPECT_EQ(script->opens.back().connectionTimeout, 11);
+    EXPECT_EQ(script->opens.back().commandTimeout, 7);
+    EXPECT_TRUE(other.execute(L"DELETE FROM t"));
+    EXPECT_EQ(script->timeouts.back(), 7);
+}
+
 TEST_F(ConnectionADOTest, ScriptModeCollectsInsteadOfRunning) {
     conn.startScriptMode();
     EXPECT_EQ(conn.endScriptMode(), nullptr);

@@ -126,6 +126,7 @@ public:
                                             long& rowsAffected) override {
         m_script->statements.push_back(text);
         m_script->parameters.push_back(params);
+        m_script->timeouts.push_back(args.timeout);
         hit(L"execute", {});
         Result r;
         if (!m_script->results.empty()) {

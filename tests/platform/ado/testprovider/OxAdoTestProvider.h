@@ -54,6 +54,7 @@ struct Script {
     // What the provider saw.
     std::vector<std::wstring> statements;
     std::vector<std::vector<OxAdoParamValue>> parameters;
+    std::vector<long> timeouts;       // the command time-out of each statement
     std::vector<std::wstring> calls;  // catalog and session calls with their arguments
     std::vector<OxAdoSession::OpenArgs> opens;
     int openSessions = 0;
