@@ -7,6 +7,7 @@
 #include <cmath>
 #include <cstring>
 #include <cwctype>
+#include <mutex>
 
 #include "platform/ado/OxAdoConnectionString.h"
 #include "platform/core/OxDateTime.h"
@@ -447,6 +448,34 @@ void OxAdoOdbcSession::fail(const OxDBException& e) {
 
 // ---------------------------------------------------------------- connecting
 
+namespace {
+struct Aliases {
+    std::mutex mutex;
+    std::vector<std::pair<std::wstring, std::wstring>> entries;
+};
+
+Aliases& aliases() {
+    static Aliases a;
+    return a;
+}
+
+std::wstring unbraced(const std::wstring& driver) {
+    std::wstring d = OxText::trim(driver);
+    if (d.size() >= 2 && d.front() == L'{' && d.back() == L'}')
+        d = d.substr(1, d.size() - 2);
+    return d;
+}
+}  // namespace
+
+void OxAdoOdbcSession::setDriverAlias(const std::wstring& driver, const std::wstring& replacement) {
+    Aliases& a = aliases();
+    std::lock_guard lock(a.mutex);
+    const std::wstring name = unbraced(driver);
+    std::erase_if(a.entries, [&](const auto& e) { return OxText::equalsNoCase(e.first, name); });
+    if (!replacement.empty())
+        a.entries.emplace_back(name, replacement);
+}
+
 std::wstring OxAdoOdbcSession::odbcConnectionString(const OpenArgs& args) {
     OxAdoConnectionString cs(args.connectionString);
     cs.remove(L"Provider");
@@ -454,6 +483,14 @@ std::wstring OxAdoOdbcSession::odbcConnectionString(const OpenArgs& args) {
     cs.remove(L"Extended Properties");
     OxAdoConnectionString odbc(extended);
     for (const auto& [k, v] : cs.pairs()) odbc.set(k, v);
+    if (odbc.has(L"Driver")) {
+        Aliases& a = aliases();
+        std::lock_guard lock(a.mutex);
+        const std::wstring driver = unbraced(odbc.get(L"Driver"));
+        for (const auto& [name, replacement] : a.entries)
+            if (OxText::equalsNoCase(name, driver))
+                odbc.set(L"Driver", replacement);
+    }
     if (!args.userId.empty())
         odbc.set(L"UID", args.userId);
     if (!args.password.empty())

@@ -62,8 +62,13 @@ public:
     void setProperty(const std::wstring& name, const OxVariant& value) override;
 
     // The ODBC connection string of a string of the model: without its Provider, with the
-    // Extended Properties unpacked, and with the user and password of Open added.
+    // Extended Properties unpacked, the driver's alias applied and the user and password of
+    // Open added.
     static std::wstring odbcConnectionString(const OpenArgs& args);
+    // Strings that name the driver (with or without braces, without case) reach the driver
+    // manager with the replacement instead: drivers of other platforms map onto installed
+    // ones. An empty replacement removes the alias.
+    static void setDriverAlias(const std::wstring& driver, const std::wstring& replacement);
     // The provider error of an ODBC failure: one record per diagnostic, numbered by the
     // class of its SQLSTATE.
     static OxAdoProviderError translate(const OxDBException& e);
