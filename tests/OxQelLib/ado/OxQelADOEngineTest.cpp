@@ -17,6 +17,14 @@
 
 using namespace OxAdo;
 
+// The two programs built from this file name their suites apart: CTest needs one name
+// per test.
+#ifdef OXQEL_ADO_TEST_SERVER
+#define EngineTest PostgresEngineTest
+#else
+#define EngineTest SqliteEngineTest
+#endif
+
 namespace {
 #ifdef OXQEL_ADO_TEST_SERVER
 constexpr bool kServer = true;
@@ -426,9 +434,8 @@ TEST_F(EngineTest, PreparedInsertsCreateThenRevalueTheirParameters) {
     EXPECT_EQ(count(*conn, table()), 2);
 }
 
+#ifdef OXQEL_ADO_TEST_SERVER
 TEST_F(EngineTest, ADroppedConnectionIsNotOpen) {
-    if (!kServer)
-        GTEST_SKIP() << "a file has no server to drop the connection";
     const auto pid = rows(*conn, L"SELECT pg_backend_pid()");
     ASSERT_EQ(pid.size(), 1u);
     auto other = second();
@@ -439,3 +446,4 @@ TEST_F(EngineTest, ADroppedConnectionIsNotOpen) {
     EXPECT_FALSE(conn->startTransaction());
     EXPECT_TRUE(conn->closeDatabase());
 }
+#endif
