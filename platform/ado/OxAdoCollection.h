@@ -33,6 +33,8 @@ public:
     Ptr item(const OxVariant& index) const {
         if (index.vt() == VT_BSTR)
             return item(index.str());
+        if (index.isEmpty() || index.isNull())
+            OxAdo::raise(OxAdo::adErrItemNotFound);
         OxVariant n;
         if (OxHr::failed(index.tryChangeType(VT_I8, n)))
             OxAdo::raise(OxAdo::adErrItemNotFound);
