@@ -12,8 +12,8 @@
 
 namespace {
 const wchar_t* const kNames[] = {L"id", L"name", L"price", L"born", L"flag", L"guid", L"data"};
-const int kTypes[] = {OxAdo::adInteger,     OxAdo::adVarWChar, OxAdo::adDouble,
-                      OxAdo::adDBTimeStamp, OxAdo::adBoolean,  OxAdo::adGUID,
+const int kTypes[] = {OxAdo::adInteger,      OxAdo::adVarWChar, OxAdo::adDouble,
+                      OxAdo::adDBTimeStamp,  OxAdo::adBoolean,  OxAdo::adGUID,
                       OxAdo::adLongVarBinary};
 
 int columnOf(const std::wstring& name) {
@@ -27,13 +27,11 @@ int columnOf(const std::wstring& name) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const std::wstring text =
         OxText::fromUtf8(std::string_view(reinterpret_cast<const char*>(data), size));
-    static const OxVariant row[] = {OxVariant(int32_t{7}),
-                                    OxVariant(L"O'Brien"),
-                                    OxVariant(2.5),
-                                    OxVariant::fromDate(44000.25),
-                                    OxVariant(true),
-                                    OxVariant(L"{00000000-0000-0000-0000-000000000001}"),
-                                    OxVariant::null()};
+    static const OxVariant row[] = {
+        OxVariant(int32_t{7}), OxVariant(L"O'Brien"),
+        OxVariant(2.5),        OxVariant::fromDate(44000.25),
+        OxVariant(true),       OxVariant(L"{00000000-0000-0000-0000-000000000001}"),
+        OxVariant::null()};
     try {
         OxAdoCriteria c = OxAdoCriteria::parse(text);
         c.bind(columnOf, [](int i) { return kTypes[i]; });
