@@ -560,13 +560,32 @@ std::wstring OxQelConnectionSQLite::escapeQuote(const std::wstring& text) const 
     return OxQel::Util::doubleApostrophes(text);
 }
 
+namespace {
+bool isExpressionDefault(const std::wstring& value) {
+    return value.find(L'(') != std::wstring::npos && value.find(L')') != std::wstring::npos;
+}
+
+// The defaults that ALTER TABLE ... ADD COLUMN refuses.
+bool isNonConstantDefault(const std::wstring& value) {
+    const std::wstring v = OxText::toUpper(OxText::trim(value));
+    return isExpressionDefault(v) || v == L"CURRENT_TIMESTAMP" || v == L"CURRENT_DATE" ||
+           v == L"CURRENT_TIME";
+}
+}  // namespace
+
 std::wstring OxQelConnectionSQLite::manageDefaultValue(const std::wstring& defaultValue,
                                                        OxQel::FieldType type,
                                                        bool canBeNull) const {
     const std::wstring typeName = convertEnumFieldType(type);
     std::wstring value = defaultValue;
-    for (const wchar_t* mark : {L"]]]", L"[[[", L"]]", L"[[", L"'", L"\""})
-        OxText::replaceAll(value, mark, L"");
+    for (const wchar_t* mark : {L"]]]", L"[[[", L"]]", L"[["}) OxText::replaceAll(value, mark, L"");
+    // An expression keeps its quotes (strftime('%s','now') means nothing without them)
+    // and goes between parentheses, as the engine wants it.
+    if (isExpressionDefault(value)) {
+        value = OxText::trim(value);
+        return value.front() == L'(' ? L"DEFAULT " + value : L"DEFAULT (" + value + L")";
+    }
+    for (const wchar_t* mark : {L"'", L"\""}) OxText::replaceAll(value, mark, L"");
     value = OxText::trim(value);
     if (!value.empty())
         return oxFormat(OxText::equalsNoCase(typeName, L"TEXT") ? L"DEFAULT '%s'" : L"DEFAULT %s",
@@ -734,13 +753,17 @@ bool OxQelConnectionSQLite::createField(const std::wstring& table, const std::ws
     if (!isOpen())
         return false;
     return OXQEL_SQLITE_GUARDED(L"OxQelConnectionSQLite::createField", [&] {
-        const std::wstring sql =
-            oxFormat(L"ALTER TABLE '%s' ADD COLUMN '%s' %s", escapeQuote(table), escapeQuote(field),
+        const std::wstring column =
+            oxFormat(L"'%s' %s", escapeQuote(field),
                      fieldClause(convertEnumFieldType(type), defaultValue, type, canBeNull));
+        const std::wstring sql =
+            oxFormat(L"ALTER TABLE '%s' ADD COLUMN %s", escapeQuote(table), column);
         if (!isOneStatement(m_handle, sql)) {
             OXQEL_REPORT(L"Invalid default value ", L"OxQelConnectionSQLite::createField", sql);
             return false;
         }
+        if (isNonConstantDefault(defaultValue))
+            return addFieldByRebuild(table, column);
         return execute(sql);
     });
 }
@@ -773,8 +796,11 @@ bool OxQelConnectionSQLite::resizeFieldString(const std::wstring&, const std::ws
 bool OxQelConnectionSQLite::createIndex(const std::wstring& indexName, bool isPrimaryKey,
                                         bool isUnique, bool, const std::wstring& table,
                                         const std::wstring& fieldList) {
+    // The engine reserves "sqlite_" for the indexes of its own constraints; an index copied
+    // from one of them keeps the rest of its name.
+    const std::wstring name = indexName.rfind(L"sqlite_", 0) == 0 ? indexName.substr(7) : indexName;
     return execute(oxFormat(L"CREATE %s INDEX IF NOT EXISTS '%s' ON '%s' (%s)",
-                            isPrimaryKey || isUnique ? L"UNIQUE" : L"", escapeQuote(indexName),
+                            isPrimaryKey || isUnique ? L"UNIQUE" : L"", escapeQuote(name),
                             escapeQuote(table), fieldList));
 }
 
@@ -894,18 +920,22 @@ bool OxQelConnectionSQLite::getTableDef(std::vector<OxQelTableDef>& tables,
         tables.clear();
         // Every object whose kind shares a bit with the mask, so that Table | View gives
         // both; the engine's own objects are listed like the others.
-        return readCatalogue(L"select * from sqlite_master", L"OxQelConnectionSQLite::getTableDef",
-                             [&](const OxQelSQLiteStatement& row) {
-                                 const OxQelTableDef::TableType type =
-                                     convertEnumTableType(row.columnText(0));
-                                 if (mask != OxQelTableDef::AllTypes && (type & mask) == 0)
-                                     return true;
-                                 OxQelTableDef def;
-                                 def.setTableName(row.columnText(1));
-                                 def.setTableType(type);
-                                 tables.push_back(def);
-                                 return true;
-                             });
+        return readCatalogue(
+            L"select * from sqlite_master", L"OxQelConnectionSQLite::getTableDef",
+            [&](const OxQelSQLiteStatement& row) {
+                OxQelTableDef::TableType type = convertEnumTableType(row.columnText(0));
+                // The engine's own tables (sequences, statistics) are
+                // system tables: no copy may make them again.
+                if (type == OxQelTableDef::Table && row.columnText(1).rfind(L"sqlite_", 0) == 0)
+                    type = OxQelTableDef::SystemTable;
+                if (mask != OxQelTableDef::AllTypes && (type & mask) == 0)
+                    return true;
+                OxQelTableDef def;
+                def.setTableName(row.columnText(1));
+                def.setTableType(type);
+                tables.push_back(def);
+                return true;
+            });
     });
 }
 
@@ -984,6 +1014,45 @@ bool OxQelConnectionSQLite::rebuildTableWithout(const std::wstring& table,
     }
     closeTransaction();
     return true;
+}
+
+bool OxQelConnectionSQLite::addFieldByRebuild(const std::wstring& table,
+                                              const std::wstring& columnDefinition) {
+    const wchar_t* function = L"OxQelConnectionSQLite::createField";
+    std::wstring createSql;
+    std::vector<std::wstring> dependents;  // indexes and triggers, made again afterwards
+    const bool read = readCatalogue(
+        oxFormat(L"SELECT type, sql FROM sqlite_master WHERE tbl_name = '%s' AND sql IS NOT NULL",
+                 escapeQuote(table)),
+        function, [&](const OxQelSQLiteStatement& row) {
+            (row.columnText(0) == L"table" ? createSql : dependents.emplace_back()) =
+                row.columnText(1);
+            return true;
+        });
+    const size_t close = createSql.rfind(L')');
+    std::vector<std::wstring> names;
+    if (!read || close == std::wstring::npos || !getAllFieldName(table, names))
+        return false;
+    createSql.insert(close, L", " + columnDefinition);
+    std::wstring columns;
+    for (const auto& name : names)
+        columns += (columns.empty() ? L"" : L",") + oxSQLiteQuoteIdentifier(name);
+    const std::wstring aside = table + L"_oxrebuild";
+    // A savepoint nests inside the caller's transaction as well as outside one.
+    if (!execute(L"SAVEPOINT oxrebuild"))
+        return false;
+    execute(L"PRAGMA legacy_alter_table=ON;");
+    bool ok = renameTable(table, aside);
+    execute(L"PRAGMA legacy_alter_table=OFF;");
+    ok = ok && execute(createSql) &&
+         execute(oxFormat(L"INSERT INTO '%s' (%s) SELECT %s FROM '%s'", escapeQuote(table), columns,
+                          columns, escapeQuote(aside))) &&
+         deleteTable(aside);
+    for (size_t i = 0; ok && i < dependents.size(); ++i) ok = execute(dependents[i]);
+    if (!ok)
+        execute(L"ROLLBACK TO oxrebuild");
+    execute(L"RELEASE oxrebuild");
+    return ok;
 }
 
 bool OxQelConnectionSQLite::modifyFieldType(const std::wstring& table, const std::wstring& field,

@@ -165,6 +165,9 @@ private:
     std::wstring temporaryTableStatement(const std::wstring& tableName, OxQel::FieldType type,
                                          size_t count, TextAt textAt);
     bool rebuildTableWithout(const std::wstring& table, const std::wstring& field);
+    // Adds a column whose default the engine's ADD COLUMN refuses (an expression, the
+    // current time) by rebuilding the table from its own definition with the column in it.
+    bool addFieldByRebuild(const std::wstring& table, const std::wstring& columnDefinition);
 
     sqlite3* m_handle = nullptr;
     bool m_isOpen = false;

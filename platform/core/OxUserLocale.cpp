@@ -3,7 +3,9 @@
 #include <atomic>
 #include <cstdlib>
 #include <cstring>
+#include <memory>
 #include <mutex>
+#include <vector>
 
 namespace {
 // Languages whose regional settings write a decimal comma.
@@ -53,13 +55,16 @@ OxUserLocale fromEnvironment() {
 }
 
 // Conversions read the locale on every call, from any thread; it is replaced rarely.
-// Replaced values are kept alive (they are tiny) so a reader never sees a freed one.
+// Replaced values stay alive (they are tiny) so a reader never sees a freed one; the
+// list owns them until the process ends.
 std::atomic<const OxUserLocale*> g_current{nullptr};
 std::mutex g_replace;
+std::vector<std::unique_ptr<OxUserLocale>> g_installed;
 
 void install(const OxUserLocale& locale) {
     std::lock_guard lock(g_replace);
-    g_current.store(new OxUserLocale(locale), std::memory_order_release);
+    g_installed.push_back(std::make_unique<OxUserLocale>(locale));
+    g_current.store(g_installed.back().get(), std::memory_order_release);
 }
 }  // namespace
 

@@ -231,3 +231,42 @@ TEST(SQLiteSchema, ModifyFieldTypeRebuildsTheColumn) {
     EXPECT_FALSE(c.findField(L"my t", L"keep_rename"));
     EXPECT_FALSE(c.modifyFieldType(L"my t", L"missing", integer));
 }
+
+// What a copy of a real database asks of the schema operations.
+TEST(SQLiteSchema, EngineObjectsAndExpressionDefaultsSurviveACopy) {
+    Database db(
+        "CREATE TABLE seq (id INTEGER PRIMARY KEY AUTOINCREMENT, a TEXT UNIQUE);"
+        "INSERT INTO seq (a) VALUES ('x');");
+    OxQelConnectionSQLite& c = db.connection();
+    std::vector<OxQelTableDef> tables;
+    ASSERT_TRUE(c.getTableDef(tables, OxQelTableDef::Table));
+    ASSERT_EQ(tables.size(), 1u) << "the engine's sqlite_sequence is no user table";
+    EXPECT_EQ(tables[0].getTableName(), L"seq");
+    ASSERT_TRUE(c.getTableDef(tables, OxQelTableDef::SystemTable));
+    ASSERT_EQ(tables.size(), 1u);
+    EXPECT_EQ(tables[0].getTableName(), L"sqlite_sequence");
+
+    // An index of a constraint carries a reserved name; made again, it drops the prefix.
+    std::vector<OxQelIndexDef> indexes;
+    ASSERT_TRUE(c.getIndexDef(L"seq", indexes));
+    ASSERT_EQ(indexes.size(), 1u);
+    EXPECT_EQ(indexes[0].getIndexName(), L"sqlite_autoindex_seq_1");
+    ASSERT_TRUE(c.createTable(L"copy", L"a", OxQel::WString, 10, L"", true));
+    EXPECT_TRUE(c.createIndex(indexes[0].getIndexName(), false, true, false, L"copy", L"a"));
+    EXPECT_EQ(db.raw().scalar("SELECT count(*) FROM sqlite_master WHERE name = 'autoindex_seq_1'"),
+              "1");
+
+    // Defaults that are expressions keep their quotes, also where ADD COLUMN refuses them.
+    ASSERT_TRUE(c.createField(L"seq", L"stamp", OxQel::Unknown, 0, L"strftime('%Y','now')", false));
+    ASSERT_TRUE(c.createField(L"seq", L"at", OxQel::Unknown, 0, L"CURRENT_TIMESTAMP", true));
+    auto raw = db.raw();
+    raw.exec("INSERT INTO seq (a) VALUES ('y');");
+    EXPECT_EQ(
+        raw.scalar("SELECT stamp = strftime('%Y','now') AND at IS NOT NULL FROM seq WHERE a = 'y'"),
+        "1");
+    EXPECT_EQ(raw.scalar("SELECT count(*) FROM seq"), "2") << "the rebuild kept the rows";
+    EXPECT_EQ(
+        raw.scalar("SELECT count(*) FROM sqlite_master WHERE name = 'sqlite_autoindex_seq_1'"), "1")
+        << "and the table's own constraints";
+    EXPECT_EQ(raw.scalar("SELECT count(*) FROM sqlite_master WHERE name LIKE '%oxrebuild%'"), "0");
+}

@@ -137,7 +137,8 @@ TEST(SQLiteTestFiles, EveryFileOpensOrFailsCleanlyAndReadsAsTheToolDoes) {
         std::vector<OxQelTableDef> objects;
         ASSERT_TRUE(c.getTableDef(objects, OxQelTableDef::AllTypes));
         std::vector<OxQelTableDef> tables;
-        ASSERT_TRUE(c.getTableDef(tables, OxQelTableDef::Table | OxQelTableDef::View));
+        ASSERT_TRUE(c.getTableDef(
+            tables, OxQelTableDef::Table | OxQelTableDef::View | OxQelTableDef::SystemTable));
         EXPECT_EQ(tables.size(),
                   std::stoul(toolRows(dir, copy.string(),
                                       "SELECT count(*) FROM sqlite_master WHERE type IN "
