@@ -68,16 +68,16 @@ std::wstring OxFormatArg::asText() const {
 }
 
 namespace {
-struct Spec {
+struct Directive {
     std::string flags;
     int width = -1;
     int precision = -1;
     wchar_t conversion = 0;
 };
 
-void pad(std::wstring& out, const std::wstring& body, const Spec& spec) {
-    const bool left = spec.flags.find('-') != std::string::npos;
-    const size_t width = spec.width > 0 ? static_cast<size_t>(spec.width) : 0;
+void pad(std::wstring& out, const std::wstring& body, const Directive& directive) {
+    const bool left = directive.flags.find('-') != std::string::npos;
+    const size_t width = directive.width > 0 ? static_cast<size_t>(directive.width) : 0;
     if (body.size() >= width) {
         out += body;
     } else if (left) {
@@ -91,15 +91,15 @@ void pad(std::wstring& out, const std::wstring& body, const Spec& spec) {
 
 // Numbers go through the C formatter with a narrow format we build ourselves, so the
 // result never depends on the argument matching the letter.
-std::wstring formatNumber(const Spec& spec, const OxFormatArg& arg) {
-    std::string fmt = "%" + spec.flags;
-    if (spec.width >= 0)
-        fmt += std::to_string(spec.width);
-    if (spec.precision >= 0)
-        fmt += "." + std::to_string(spec.precision);
+std::wstring formatNumber(const Directive& directive, const OxFormatArg& arg) {
+    std::string fmt = "%" + directive.flags;
+    if (directive.width >= 0)
+        fmt += std::to_string(directive.width);
+    if (directive.precision >= 0)
+        fmt += "." + std::to_string(directive.precision);
     char buf[512];
-    const char c = static_cast<char>(spec.conversion);
-    switch (spec.conversion) {
+    const char c = static_cast<char>(directive.conversion);
+    switch (directive.conversion) {
         case L'd':
         case L'i':
             fmt += "lld";
@@ -137,11 +137,11 @@ std::wstring oxFormatArgs(std::wstring_view format, const OxFormatArg* args, siz
             ++i;
             continue;
         }
-        Spec spec;
+        Directive directive;
         size_t j = i + 1;
         while (j < format.size() &&
                std::wstring_view(L"-+ #0").find(format[j]) != std::wstring_view::npos)
-            spec.flags.push_back(static_cast<char>(format[j++]));
+            directive.flags.push_back(static_cast<char>(format[j++]));
         auto readNumber = [&](int& target) {
             if (j < format.size() && format[j] == L'*') {
                 target = next < count ? static_cast<int>(args[next++].asSigned()) : 0;
@@ -155,12 +155,12 @@ std::wstring oxFormatArgs(std::wstring_view format, const OxFormatArg* args, siz
                 v = 256;  // keeps a hostile template from asking for huge padding
             target = v;
         };
-        readNumber(spec.width);
+        readNumber(directive.width);
         if (j < format.size() && format[j] == L'.') {
             ++j;
-            readNumber(spec.precision);
-            if (spec.precision < 0)
-                spec.precision = 0;
+            readNumber(directive.precision);
+            if (directive.precision < 0)
+                directive.precision = 0;
         }
         while (j < format.size() &&
                std::wstring_view(L"hlLqjzt").find(format[j]) != std::wstring_view::npos)
@@ -169,9 +169,9 @@ std::wstring oxFormatArgs(std::wstring_view format, const OxFormatArg* args, siz
             out.append(format.substr(i));
             break;
         }
-        spec.conversion = format[j];
+        directive.conversion = format[j];
         const std::wstring_view conversions = L"scSCdiuxXofFeEgG";
-        if (conversions.find(spec.conversion) == std::wstring_view::npos) {
+        if (conversions.find(directive.conversion) == std::wstring_view::npos) {
             out.append(format.substr(i, j - i + 1));
             i = j;
             continue;
@@ -180,25 +180,26 @@ std::wstring oxFormatArgs(std::wstring_view format, const OxFormatArg* args, siz
         if (next >= count)
             continue;  // a missing argument formats as nothing
         const OxFormatArg& arg = args[next++];
-        switch (spec.conversion) {
+        switch (directive.conversion) {
             case L's':
             case L'S': {
                 std::wstring text = arg.asText();
-                if (spec.precision >= 0 && text.size() > static_cast<size_t>(spec.precision))
-                    text.resize(static_cast<size_t>(spec.precision));
-                pad(out, text, spec);
+                if (directive.precision >= 0 &&
+                    text.size() > static_cast<size_t>(directive.precision))
+                    text.resize(static_cast<size_t>(directive.precision));
+                pad(out, text, directive);
                 break;
             }
             case L'c':
             case L'C':
-                pad(out, std::wstring(1, static_cast<wchar_t>(arg.asSigned())), spec);
+                pad(out, std::wstring(1, static_cast<wchar_t>(arg.asSigned())), directive);
                 break;
             default:
                 if (arg.kind() == OxFormatArg::Kind::WideText ||
                     arg.kind() == OxFormatArg::Kind::NarrowText)
-                    pad(out, arg.asText(), spec);
+                    pad(out, arg.asText(), directive);
                 else
-                    out += formatNumber(spec, arg);
+                    out += formatNumber(directive, arg);
                 break;
         }
     }
